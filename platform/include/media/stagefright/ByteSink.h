@@ -1,0 +1,70 @@
+#ifndef BYTE_SINK_H_
+#define BYTE_SINK_H_
+
+#include <cstddef>
+#include <cstdint>
+#include <string>
+#include <sys/types.h>
+
+#include <utils/Errors.h>
+#include <utils/RefBase.h>
+
+namespace android {
+
+// Where writers put their bytes: appends at the end, and rewrites earlier
+// bytes in place (sizes fixed up when a file is finished).
+class ByteSink : public RefBase {
+public:
+    // Appends; OK or an error status (ERROR_IO).
+    virtual status_t write(const void* data, size_t size) = 0;
+    // Overwrites bytes that were already written.
+    virtual status_t writeAt(int64_t offset, const void* data, size_t size) = 0;
+    // Bytes written so far (the append position).
+    virtual int64_t position() const = 0;
+
+    status_t writeU8(uint8_t v) { return write(&v, 1); }
+    status_t writeBE16(uint16_t v);
+    status_t writeBE32(uint32_t v);
+    status_t writeBE64(uint64_t v);
+    status_t writeLE16(uint16_t v);
+    status_t writeLE32(uint32_t v);
+    status_t writeFourcc(const char* fourcc) { return write(fourcc, 4); }
+
+protected:
+    ~ByteSink() override = default;
+};
+
+// A caller's descriptor, written from its current offset on; the caller keeps
+// ownership of the descriptor.
+class FdSink : public ByteSink {
+public:
+    explicit FdSink(int fd);
+    status_t initCheck() const { return mFd >= 0 ? OK : NO_INIT; }
+    status_t write(const void* data, size_t size) override;
+    status_t writeAt(int64_t offset, const void* data, size_t size) override;
+    int64_t position() const override { return mPosition; }
+    // Pushes what was written to the device.
+    status_t sync();
+
+private:
+    status_t pwriteAll(int64_t fileOffset, const void* data, size_t size);
+    int mFd;
+    int64_t mBase;      // file offset of byte 0 of the sink
+    int64_t mPosition;  // bytes appended
+};
+
+// Bytes in memory, for tests and for building boxes before they are sized.
+class MemorySink : public ByteSink {
+public:
+    status_t write(const void* data, size_t size) override;
+    status_t writeAt(int64_t offset, const void* data, size_t size) override;
+    int64_t position() const override { return static_cast<int64_t>(mBytes.size()); }
+    const std::string& bytes() const { return mBytes; }
+
+private:
+    std::string mBytes;
+};
+
+}  // namespace android
+
+#endif

@@ -1,0 +1,87 @@
+#define LOG_TAG "ByteSink"
+#include <media/stagefright/ByteSink.h>
+
+#include <cerrno>
+#include <cstring>
+#include <unistd.h>
+
+#include <log/log.h>
+#include <media/stagefright/MediaErrors.h>
+
+namespace android {
+
+status_t ByteSink::writeBE16(uint16_t v) {
+    const uint8_t b[2] = {uint8_t(v >> 8), uint8_t(v)};
+    return write(b, 2);
+}
+status_t ByteSink::writeBE32(uint32_t v) {
+    const uint8_t b[4] = {uint8_t(v >> 24), uint8_t(v >> 16), uint8_t(v >> 8), uint8_t(v)};
+    return write(b, 4);
+}
+status_t ByteSink::writeBE64(uint64_t v) {
+    status_t err = writeBE32(uint32_t(v >> 32));
+    return err != OK ? err : writeBE32(uint32_t(v));
+}
+status_t ByteSink::writeLE16(uint16_t v) {
+    const uint8_t b[2] = {uint8_t(v), uint8_t(v >> 8)};
+    return write(b, 2);
+}
+status_t ByteSink::writeLE32(uint32_t v) {
+    const uint8_t b[4] = {uint8_t(v), uint8_t(v >> 8), uint8_t(v >> 16), uint8_t(v >> 24)};
+    return write(b, 4);
+}
+
+FdSink::FdSink(int fd) : mFd(fd), mBase(0), mPosition(0) {
+    if (fd < 0) return;
+    const off_t current = lseek(fd, 0, SEEK_CUR);
+    mBase = current > 0 ? current : 0;
+}
+
+status_t FdSink::pwriteAll(int64_t fileOffset, const void* data, size_t size) {
+    if (mFd < 0) return NO_INIT;
+    const uint8_t* p = static_cast<const uint8_t*>(data);
+    while (size > 0) {
+        const ssize_t n = pwrite(mFd, p, size, fileOffset);
+        if (n < 0) {
+            if (errno == EINTR) continue;
+            ALOGE("write failed: %s", strerror(errno));
+            return ERROR_IO;
+        }
+        if (n == 0) return ERROR_IO;
+        p += n;
+        size -= static_cast<size_t>(n);
+        fileOffset += n;
+    }
+    return OK;
+}
+
+status_t FdSink::write(const void* data, size_t size) {
+    const status_t err = pwriteAll(mBase + mPosition, data, size);
+    if (err == OK) mPosition += static_cast<int64_t>(size);
+    return err;
+}
+
+status_t FdSink::writeAt(int64_t offset, const void* data, size_t size) {
+    if (offset < 0 || offset + static_cast<int64_t>(size) > mPosition) return BAD_VALUE;
+    return pwriteAll(mBase + offset, data, size);
+}
+
+status_t FdSink::sync() {
+    if (mFd < 0) return NO_INIT;
+    // Pipes and character devices cannot be synced; that is not a failure.
+    if (fsync(mFd) != 0 && errno != EINVAL && errno != EROFS) return ERROR_IO;
+    return OK;
+}
+
+status_t MemorySink::write(const void* data, size_t size) {
+    mBytes.append(static_cast<const char*>(data), size);
+    return OK;
+}
+
+status_t MemorySink::writeAt(int64_t offset, const void* data, size_t size) {
+    if (offset < 0 || static_cast<size_t>(offset) + size > mBytes.size()) return BAD_VALUE;
+    memcpy(&mBytes[static_cast<size_t>(offset)], data, size);
+    return OK;
+}
+
+}  // namespace android

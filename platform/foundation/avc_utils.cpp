@@ -1,0 +1,86 @@
+#include <media/stagefright/foundation/avc_utils.h>
+
+#include <cstring>
+
+namespace android {
+
+namespace {
+
+bool parseUEGraceful(ABitReader* br, uint32_t* out) {
+    size_t zeros = 0;
+    for (;;) {
+        uint32_t bit;
+        if (!br->getBitsGraceful(1, &bit)) return false;
+        if (bit != 0) break;
+        // 2^32 - 1 + b does not fit; such codes do not occur in valid streams.
+        if (++zeros == 32) return false;
+    }
+    uint32_t suffix = 0;
+    if (zeros > 0 && !br->getBitsGraceful(zeros, &suffix)) return false;
+    *out = ((1u << zeros) - 1) + suffix;
+    return true;
+}
+
+}  // namespace
+
+unsigned parseUE(ABitReader* br) { return parseUEWithFallback(br, 0); }
+
+unsigned parseUEWithFallback(ABitReader* br, unsigned fallback) {
+    uint32_t value;
+    return parseUEGraceful(br, &value) ? value : fallback;
+}
+
+int32_t parseSE(ABitReader* br) { return parseSEWithFallback(br, 0); }
+
+int32_t parseSEWithFallback(ABitReader* br, int32_t fallback) {
+    uint32_t code;
+    if (!parseUEGraceful(br, &code)) return fallback;
+    // 1, -1, 2, -2, ... for codes 1, 2, 3, 4, ...; the largest code (2^32 - 2)
+    // maps to -(2^31 - 1), so the magnitude always fits.
+    const int32_t magnitude = static_cast<int32_t>((code >> 1) + (code & 1));
+    return (code & 1) ? magnitude : -magnitude;
+}
+
+size_t findStartCodePrefix(const uint8_t* data, size_t size) {
+    if (size < 3) return size;
+    // 0x01 is rare in coded slices, so looking for it first lets memchr do
+    // almost all of the work.
+    const uint8_t* p = data + 2;
+    const uint8_t* const end = data + size;
+    while (p < end) {
+        p = static_cast<const uint8_t*>(memchr(p, 0x01, end - p));
+        if (p == nullptr) return size;
+        if (p[-1] == 0 && p[-2] == 0) return (p - 2) - data;
+        ++p;
+    }
+    return size;
+}
+
+bool nextAnnexBUnit(const uint8_t** data, size_t* size, const uint8_t** unit, size_t* unitSize) {
+    const uint8_t* p = *data;
+    size_t n = *size;
+    for (;;) {
+        const size_t prefix = findStartCodePrefix(p, n);
+        if (prefix == n) {
+            *data = p + n;
+            *size = 0;
+            return false;
+        }
+        const size_t begin = prefix + 3;
+        const size_t end = begin + findStartCodePrefix(p + begin, n - begin);
+        size_t last = end;
+        while (last > begin && p[last - 1] == 0) --last;
+        const uint8_t* const found = p + begin;
+        p += end;
+        n -= end;
+        if (last > begin) {
+            *unit = found;
+            *unitSize = last - begin;
+            *data = p;
+            *size = n;
+            return true;
+        }
+    }
+}
+
+}  // namespace android

@@ -66,6 +66,21 @@ status_t FdSink::writeAt(int64_t offset, const void* data, size_t size) {
     return pwriteAll(mBase + offset, data, size);
 }
 
+status_t FdSink::readAt(int64_t offset, void* data, size_t size) {
+    if (mFd < 0) return NO_INIT;
+    if (offset < 0 || offset + static_cast<int64_t>(size) > mPosition) return BAD_VALUE;
+    uint8_t* p = static_cast<uint8_t*>(data);
+    while (size > 0) {
+        const ssize_t n = pread(mFd, p, size, mBase + offset);
+        if (n < 0 && errno == EINTR) continue;
+        if (n <= 0) return ERROR_IO;
+        p += n;
+        size -= static_cast<size_t>(n);
+        offset += n;
+    }
+    return OK;
+}
+
 status_t FdSink::sync() {
     if (mFd < 0) return NO_INIT;
     // Pipes and character devices cannot be synced; that is not a failure.
@@ -81,6 +96,12 @@ status_t MemorySink::write(const void* data, size_t size) {
 status_t MemorySink::writeAt(int64_t offset, const void* data, size_t size) {
     if (offset < 0 || static_cast<size_t>(offset) + size > mBytes.size()) return BAD_VALUE;
     memcpy(&mBytes[static_cast<size_t>(offset)], data, size);
+    return OK;
+}
+
+status_t MemorySink::readAt(int64_t offset, void* data, size_t size) {
+    if (offset < 0 || static_cast<size_t>(offset) + size > mBytes.size()) return BAD_VALUE;
+    memcpy(data, &mBytes[static_cast<size_t>(offset)], size);
     return OK;
 }
 

@@ -20,6 +20,9 @@ public:
     void setFeatureValue(const char* section, const char* key, const char* value);
     void removeFeatureValue(const char* section, const char* key);
     void clear();
+    // Takes these values in place of the current ones; values that do not
+    // change keep their text (and pointers to it stay valid).
+    void replaceAll(const std::map<std::string, std::map<std::string, std::string>>& values);
 
 private:
     std::mutex mLock;
@@ -37,8 +40,11 @@ public:
 
     // Reads the settings file again (tests and tools).
     void reload();
-    // Reads another settings file instead (tests).
+    // Reads another settings file instead (tests); null goes back to the
+    // default path.
     void setSettingsPath(const char* path);
+    // The file the values come from.
+    std::string settingsPath();
 
 private:
     Kestro();

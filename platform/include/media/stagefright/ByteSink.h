@@ -21,6 +21,9 @@ public:
     virtual status_t writeAt(int64_t offset, const void* data, size_t size) = 0;
     // Bytes written so far (the append position).
     virtual int64_t position() const = 0;
+    // Reads back bytes already written, for writers that move data when they
+    // finish; INVALID_OPERATION where the sink cannot be read.
+    virtual status_t readAt(int64_t offset, void* data, size_t size) { return INVALID_OPERATION; }
 
     status_t writeU8(uint8_t v) { return write(&v, 1); }
     status_t writeBE16(uint16_t v);
@@ -43,6 +46,8 @@ public:
     status_t write(const void* data, size_t size) override;
     status_t writeAt(int64_t offset, const void* data, size_t size) override;
     int64_t position() const override { return mPosition; }
+    // Needs a descriptor opened for reading too.
+    status_t readAt(int64_t offset, void* data, size_t size) override;
     // Pushes what was written to the device.
     status_t sync();
 
@@ -59,6 +64,7 @@ public:
     status_t write(const void* data, size_t size) override;
     status_t writeAt(int64_t offset, const void* data, size_t size) override;
     int64_t position() const override { return static_cast<int64_t>(mBytes.size()); }
+    status_t readAt(int64_t offset, void* data, size_t size) override;
     const std::string& bytes() const { return mBytes; }
 
 private:

@@ -1,0 +1,134 @@
+#ifndef TESTS_AUDIO_WRITER_TEST_SUPPORT_H
+#define TESTS_AUDIO_WRITER_TEST_SUPPORT_H
+
+// Shared by the WAVE, FLAC and AMR writer tests: a scratch file, a source the
+// writer pulls from (the muxer's adapter), and the command-line checkers.
+
+#include <fcntl.h>
+#include <unistd.h>
+
+#include <cstdint>
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+#include <fstream>
+#include <iterator>
+#include <string>
+#include <vector>
+
+#include <media/stagefright/MediaAdapter.h>
+#include <media/stagefright/MediaBuffer.h>
+#include <media/stagefright/MetaData.h>
+
+namespace writertest {
+
+using Bytes = std::vector<uint8_t>;
+
+// A file in the temporary directory, removed with the object; fd is open for
+// reading and writing.
+class ScratchFile {
+public:
+    explicit ScratchFile(const char* suffix = "") {
+        const char* dir = getenv("TMPDIR");
+        mPath = std::string(dir && *dir ? dir : "/tmp") + "/writertest-XXXXXX" + suffix;
+        std::vector<char> name(mPath.begin(), mPath.end());
+        name.push_back('\0');
+        fd = mkstemps(name.data(), static_cast<int>(strlen(suffix)));
+        mPath = name.data();
+    }
+    ~ScratchFile() {
+        if (fd >= 0) close(fd);
+        unlink(mPath.c_str());
+    }
+    const std::string& path() const { return mPath; }
+    Bytes bytes() const {
+        std::ifstream in(mPath, std::ios::binary);
+        return Bytes(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
+    }
+    int fd = -1;
+
+private:
+    std::string mPath;
+};
+
+inline android::sp<android::MediaAdapter> makeSource(const android::sp<android::MetaData>& format) {
+    return new android::MediaAdapter(format);
+}
+
+// Pushes one sample the way the muxer does (the adapter takes the reference).
+inline android::status_t push(const android::sp<android::MediaAdapter>& source, const uint8_t* data, size_t size,
+                              int64_t timeUs = 0, bool codecConfig = false) {
+    auto* buffer = new android::MediaBuffer(size);
+    if (size > 0) memcpy(buffer->data(), data, size);
+    buffer->meta_data().setInt64(android::kKeyTime, timeUs);
+    if (codecConfig) buffer->meta_data().setInt32(android::kKeyIsCodecConfig, 1);
+    buffer->add_ref();
+    return source->pushBuffer(buffer);
+}
+
+inline android::status_t push(const android::sp<android::MediaAdapter>& source, const Bytes& bytes,
+                              int64_t timeUs = 0, bool codecConfig = false) {
+    return push(source, bytes.data(), bytes.size(), timeUs, codecConfig);
+}
+
+// Pushes `bytes` in pieces of `piece` bytes.
+inline void pushInPieces(const android::sp<android::MediaAdapter>& source, const Bytes& bytes, size_t piece) {
+    for (size_t pos = 0; pos < bytes.size(); pos += piece) {
+        push(source, bytes.data() + pos, std::min(piece, bytes.size() - pos));
+    }
+}
+
+inline bool haveTool(const char* name) {
+    const std::string command = std::string("command -v ") + name + " >/dev/null 2>&1";
+    return system(command.c_str()) == 0;
+}
+
+// Runs a shell command; its exit status, and what it printed on stdout.
+inline int run(const std::string& command, std::string* output = nullptr) {
+    FILE* pipe = popen((command + " 2>/dev/null").c_str(), "r");
+    if (pipe == nullptr) return -1;
+    std::string text;
+    char chunk[4096];
+    size_t n;
+    while ((n = fread(chunk, 1, sizeof(chunk), pipe)) > 0) text.append(chunk, n);
+    const int status = pclose(pipe);
+    if (output != nullptr) *output = text;
+    return WIFEXITED(status) ? WEXITSTATUS(status) : -1;
+}
+
+inline Bytes readFile(const std::string& path) {
+    std::ifstream in(path, std::ios::binary);
+    return Bytes(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
+}
+
+inline void writeFile(const std::string& path, const Bytes& bytes) {
+    std::ofstream out(path, std::ios::binary);
+    out.write(reinterpret_cast<const char*>(bytes.data()), static_cast<std::streamsize>(bytes.size()));
+}
+
+// Interleaved 16-bit little-endian tones, a different pitch per channel.
+inline Bytes tone16(int channels, int frames, int sampleRate) {
+    Bytes out;
+    out.reserve(static_cast<size_t>(frames) * channels * 2);
+    uint32_t noise = 12345;
+    for (int i = 0; i < frames; ++i) {
+        for (int c = 0; c < channels; ++c) {
+            // A sawtooth plus a little noise: compressible but not trivial.
+            noise = noise * 1103515245u + 12345u;
+            const int period = 50 + 17 * c;
+            const int v = ((i % period) * 20000 / period) - 10000 + int((noise >> 16) & 0xFF) - 128;
+            out.push_back(uint8_t(v));
+            out.push_back(uint8_t(v >> 8));
+        }
+    }
+    (void)sampleRate;
+    return out;
+}
+
+inline uint32_t le32(const uint8_t* p) { return p[0] | (p[1] << 8) | (p[2] << 16) | (uint32_t(p[3]) << 24); }
+inline uint16_t le16(const uint8_t* p) { return uint16_t(p[0] | (p[1] << 8)); }
+inline uint32_t be24(const uint8_t* p) { return (p[0] << 16) | (p[1] << 8) | p[2]; }
+
+}  // namespace writertest
+
+#endif

@@ -1,7 +1,67 @@
-// Placeholder until the extractor lands.
+#define LOG_TAG "WAVExtractor"
+#include "wav/WAVExtractor.h"
+
+#include <cstring>
+
+#include <log/log.h>
+#include <media/stagefright/MediaDefs.h>
+
+#include "extractor/DeviceKeys.h"
 #include "extractor/Sniffers.h"
+#include "wav/WAVSource.h"
 
 namespace android {
-float SniffWAV(const sp<DataSource>&) { return 0.0f; }
-sp<IMediaExtractor> CreateWAVExtractor(const sp<DataSource>&) { return nullptr; }
+
+sp<WAVExtractor> WAVExtractor::Create(const sp<DataSource>& source) {
+    WAVInfo info;
+    const status_t err = ParseWAVHeader(source, &info);
+    if (err != OK) {
+        ALOGW("not a usable WAVE file (%d)", err);
+        return nullptr;
+    }
+    return new WAVExtractor(source, info);
+}
+
+WAVExtractor::WAVExtractor(const sp<DataSource>& source, const WAVInfo& info)
+    : mSource(source), mInfo(info), mFileMeta(new MetaData), mTrackMeta(new MetaData) {
+    mFileMeta->setCString(kKeyMIMEType, MEDIA_MIMETYPE_CONTAINER_WAV);
+    info.items.publishFileItems(mFileMeta.get());
+
+    MetaData* t = mTrackMeta.get();
+    t->setCString(kKeyMIMEType, MEDIA_MIMETYPE_AUDIO_RAW);
+    t->setInt32(kKeyChannelCount, info.channels);
+    t->setInt32(kKeySampleRate, static_cast<int32_t>(info.sampleRate));
+    if (info.channelMask != 0) t->setInt32(kKeyChannelMask, static_cast<int32_t>(info.channelMask));
+    t->setInt64(kKeyDuration, TicksToUs(info.frameCount, info.sampleRate));
+    t->setInt32(kKeyBitRate, static_cast<int32_t>(info.sampleRate * info.frameSize * 8));
+    t->setInt32(kKeyBitsPerSample, info.bitsPerSample);
+    t->setInt32(kKeyDeviceBitsPerSample, info.bitsPerSample);
+    t->setInt32(kKeyPcmEncoding, WAVPcmEncoding(info));
+    t->setInt32(kKeyMaxInputSize,
+                static_cast<int32_t>(WAVSource::FramesPerSample(info.frameSize) * info.frameSize));
+    info.items.publishTrackItems(t);
+}
+
+sp<IMediaSource> WAVExtractor::getTrack(size_t index) {
+    if (index != 0) return nullptr;
+    return new WAVSource(mSource, mInfo, mTrackMeta);
+}
+
+sp<MetaData> WAVExtractor::getTrackMetaData(size_t index, uint32_t /*flags*/) {
+    if (index != 0) return nullptr;
+    return new MetaData(*mTrackMeta);
+}
+
+sp<MetaData> WAVExtractor::getMetaData() { return new MetaData(*mFileMeta); }
+
+float SniffWAV(const sp<DataSource>& source) {
+    uint8_t head[12];
+    if (!source->readExactly(0, head, sizeof(head))) return 0.0f;
+    return memcmp(head, "RIFF", 4) == 0 && memcmp(head + 8, "WAVE", 4) == 0 ? 0.8f : 0.0f;
+}
+
+sp<IMediaExtractor> CreateWAVExtractor(const sp<DataSource>& source) {
+    return WAVExtractor::Create(source);
+}
+
 }  // namespace android

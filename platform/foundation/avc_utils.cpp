@@ -41,6 +41,42 @@ int32_t parseSEWithFallback(ABitReader* br, int32_t fallback) {
     return (code & 1) ? magnitude : -magnitude;
 }
 
+void parseHEVCSPS(const uint8_t* payload, size_t size, HEVCSPSInfo* info) {
+    NALBitReader br(payload, size);
+    br.skipBits(4);  // sps_video_parameter_set_id
+    info->maxSubLayersMinus1 = br.getBitsWithFallback(3, 0);
+    info->temporalIdNesting = br.getBitsWithFallback(1, 0);
+    for (uint8_t& b : info->profileTierLevel) b = static_cast<uint8_t>(br.getBitsWithFallback(8, 0));
+    const uint32_t m = info->maxSubLayersMinus1;
+    bool profilePresent[8] = {}, levelPresent[8] = {};
+    if (m > 0) {
+        for (uint32_t j = 0; j < m; ++j) {
+            profilePresent[j] = br.getBitsWithFallback(1, 0) != 0;
+            levelPresent[j] = br.getBitsWithFallback(1, 0) != 0;
+        }
+        br.skipBits(16 - 2 * m);  // reserved_zero_2bits up to eight sub-layers
+        for (uint32_t j = 0; j < m; ++j) {
+            if (profilePresent[j]) br.skipBits(88);
+            if (levelPresent[j]) br.skipBits(8);
+        }
+    }
+    parseUEWithFallback(&br, 0);  // sps_seq_parameter_set_id
+    info->chromaFormatIdc = parseUEWithFallback(&br, 0);
+    if ((info->chromaFormatIdc & 0xFF) == 3) br.skipBits(1);  // separate_colour_plane_flag
+    info->width = parseUEWithFallback(&br, 0);
+    info->height = parseUEWithFallback(&br, 0);
+    info->conformanceWindow = br.getBitsWithFallback(1, 0) != 0;
+    info->confLeft = info->confRight = info->confTop = info->confBottom = 0;
+    if (info->conformanceWindow) {
+        info->confLeft = parseUEWithFallback(&br, 0);
+        info->confRight = parseUEWithFallback(&br, 0);
+        info->confTop = parseUEWithFallback(&br, 0);
+        info->confBottom = parseUEWithFallback(&br, 0);
+    }
+    info->bitDepthLumaMinus8 = parseUEWithFallback(&br, 0);
+    info->bitDepthChromaMinus8 = parseUEWithFallback(&br, 0);
+}
+
 size_t findStartCodePrefix(const uint8_t* data, size_t size) {
     if (size < 3) return size;
     // 0x01 is rare in coded slices, so looking for it first lets memchr do

@@ -1,6 +1,5 @@
 #include "CodecSpecificData.h"
 
-#include <media/stagefright/foundation/ABitReader.h>
 #include <media/stagefright/foundation/ByteReader.h>
 #include <media/stagefright/foundation/avc_utils.h>
 
@@ -81,45 +80,6 @@ bool findDescriptor(ByteReader* r, uint8_t wanted, ByteReader* body) {
     return false;
 }
 
-struct HevcSpsFields {
-    uint8_t profileTierLevel[12];
-    uint32_t maxSubLayersMinus1;
-    uint32_t temporalIdNesting;
-    uint32_t chromaFormatIdc;
-    uint32_t bitDepthLumaMinus8;
-    uint32_t bitDepthChromaMinus8;
-};
-
-// ITU-T H.265 7.3.2.2 up to the bit depths; missing fields read as 0.
-void parseHevcSps(const uint8_t* unit, size_t size, HevcSpsFields* f) {
-    NALBitReader br(unit + 2, size - 2);
-    br.skipBits(4);
-    f->maxSubLayersMinus1 = br.getBitsWithFallback(3, 0);
-    f->temporalIdNesting = br.getBitsWithFallback(1, 0);
-    for (uint8_t& b : f->profileTierLevel) b = static_cast<uint8_t>(br.getBitsWithFallback(8, 0));
-    const uint32_t m = f->maxSubLayersMinus1;
-    bool profilePresent[8] = {}, levelPresent[8] = {};
-    for (uint32_t j = 0; j < m; ++j) {
-        profilePresent[j] = br.getBitsWithFallback(1, 0) != 0;
-        levelPresent[j] = br.getBitsWithFallback(1, 0) != 0;
-    }
-    if (m > 0) br.skipBits(2 * (8 - m));
-    for (uint32_t j = 0; j < m; ++j) {
-        if (profilePresent[j]) br.skipBits(88);
-        if (levelPresent[j]) br.skipBits(8);
-    }
-    parseUEWithFallback(&br, 0);  // sps_seq_parameter_set_id
-    f->chromaFormatIdc = parseUEWithFallback(&br, 1);
-    if (f->chromaFormatIdc == 3) br.skipBits(1);
-    parseUEWithFallback(&br, 0);  // pic_width_in_luma_samples
-    parseUEWithFallback(&br, 0);  // pic_height_in_luma_samples
-    if (br.getBitsWithFallback(1, 0)) {
-        for (int i = 0; i < 4; ++i) parseUEWithFallback(&br, 0);
-    }
-    f->bitDepthLumaMinus8 = parseUEWithFallback(&br, 0);
-    f->bitDepthChromaMinus8 = parseUEWithFallback(&br, 0);
-}
-
 }  // namespace
 
 bool isAnnexB(const uint8_t* data, size_t size) {
@@ -190,8 +150,8 @@ bool annexBToHvcc(const uint8_t* data, size_t size, Bytes* hvcc) {
         if (!seen) types.push_back(type);
     }
     if (sps == nullptr || types.size() > 255) return false;
-    HevcSpsFields f;
-    parseHevcSps(sps->data, sps->size, &f);
+    HEVCSPSInfo f;
+    parseHEVCSPS(sps->data + 2, sps->size - 2, &f);
     hvcc->assign({1});
     hvcc->insert(hvcc->end(), f.profileTierLevel, f.profileTierLevel + 11);  // profile to constraint flags
     hvcc->push_back(f.profileTierLevel[11]);                                 // general_level_idc

@@ -17,6 +17,23 @@ unsigned parseUEWithFallback(ABitReader* br, unsigned fallback);
 int32_t parseSE(ABitReader* br);
 int32_t parseSEWithFallback(ABitReader* br, int32_t fallback);
 
+// The leading fields of an HEVC sequence parameter set (ITU-T H.265
+// 7.3.2.2) up to the bit depths. Reads past the end give 0.
+struct HEVCSPSInfo {
+    uint8_t profileTierLevel[12];  // general profile, tier, flags and level_idc
+    uint32_t maxSubLayersMinus1;
+    uint32_t temporalIdNesting;
+    uint32_t chromaFormatIdc;
+    uint32_t width;  // pic_width_in_luma_samples
+    uint32_t height;
+    bool conformanceWindow;
+    uint32_t confLeft, confRight, confTop, confBottom;
+    uint32_t bitDepthLumaMinus8;
+    uint32_t bitDepthChromaMinus8;
+};
+// payload: the unit after its two header bytes, emulation prevention included.
+void parseHEVCSPS(const uint8_t* payload, size_t size, HEVCSPSInfo* info);
+
 // Offset of the first 00 00 01 in data[0, size), or size when there is none.
 size_t findStartCodePrefix(const uint8_t* data, size_t size);
 

@@ -7,7 +7,7 @@
 #include <media/stagefright/MediaDefs.h>
 #include <media/stagefright/MediaErrors.h>
 
-#include "writer/DeviceItems.h"
+#include "writer/WriterDeviceItems.h"
 #include "writer/PcmLayout.h"
 #include "writer/SingleSourceWriter.h"
 #include "writers/WaveChunks.h"
@@ -41,9 +41,9 @@ struct QNWAVEWriter::Impl : public SingleSourceWriter::Format {
     status_t writeSample(ByteSink& sink, MediaBufferBase& buffer) override;
     status_t finish(ByteSink& sink) override;
 
-    std::vector<uint8_t> trailer(const DeviceItems::Snapshot& items) const;
+    std::vector<uint8_t> trailer(const WriterDeviceItems::Snapshot& items) const;
 
-    DeviceItems items{"QNWAVEWriter"};
+    WriterDeviceItems items{"QNWAVEWriter"};
     PcmLayout layout;
     WaveChunks::Header header;
     uint64_t dataBytes = 0;
@@ -68,7 +68,7 @@ status_t QNWAVEWriter::Impl::checkSource(const sp<MetaData>& format) {
     return OK;
 }
 
-std::vector<uint8_t> QNWAVEWriter::Impl::trailer(const DeviceItems::Snapshot& s) const {
+std::vector<uint8_t> QNWAVEWriter::Impl::trailer(const WriterDeviceItems::Snapshot& s) const {
     std::vector<uint8_t> out;
     if (s.hasWaveform) WaveChunks::appendChunk(&out, "wafm", s.waveform.data(), s.waveform.size());
     if (s.hasUserMessage) WaveChunks::appendChunk(&out, "umsg", s.userMessage.data(), s.userMessage.size());
@@ -83,7 +83,7 @@ std::vector<uint8_t> QNWAVEWriter::Impl::trailer(const DeviceItems::Snapshot& s)
 
 status_t QNWAVEWriter::Impl::writeHeader(ByteSink& sink, const sp<MetaData>&) {
     header = WaveChunks::buildHeader(layout);
-    DeviceItems::Snapshot known = items.snapshot();
+    WriterDeviceItems::Snapshot known = items.snapshot();
     known.waveform.clear();
     known.hasWaveform = false;
     maxDataBytes = WaveChunks::maxDataBytes(header.bytes.size(), trailer(known).size() + kWaveformRoom,

@@ -7,7 +7,7 @@
 #include <media/stagefright/MediaDefs.h>
 #include <media/stagefright/MediaErrors.h>
 
-#include "amr/AMRFrameTable.h"
+#include "amr/AMRFrames.h"
 #include "writer/SingleSourceWriter.h"
 
 namespace android {
@@ -56,9 +56,9 @@ status_t AMRWriter::Impl::writeHeader(ByteSink& sink, const sp<MetaData>&) {
 bool AMRWriter::Impl::isWellFormed(const uint8_t* data, size_t size) const {
     size_t pos = 0;
     while (pos < size) {
-        const int payload = AMRFrameTable::payloadBytes(wideband, AMRFrameTable::frameType(data[pos]));
-        if (payload < 0 || static_cast<size_t>(payload) + 1 > size - pos) return false;
-        pos += static_cast<size_t>(payload) + 1;
+        const size_t frame = AMRFrameSize(wideband, data[pos]);
+        if (frame == 0 || frame > size - pos) return false;
+        pos += frame;
     }
     return true;
 }
@@ -69,7 +69,7 @@ status_t AMRWriter::Impl::writeSample(ByteSink& sink, MediaBufferBase& buffer) {
     // One bad frame would make every later frame unreadable: keep it out.
     if (!isWellFormed(data, size)) {
         ++dropped;
-        ALOGW("dropped a malformed sample of %zu bytes (frame type %u)", size, AMRFrameTable::frameType(data[0]));
+        ALOGW("dropped a malformed sample of %zu bytes (frame type %u)", size, (data[0] >> 3) & 0x0F);
         return OK;
     }
     return sink.write(data, size);

@@ -8,10 +8,11 @@
 #include <media/stagefright/MediaDefs.h>
 #include <media/stagefright/MediaErrors.h>
 
+#include "extractor/DeviceKeys.h"
 #include "flac/FlacFrameHeader.h"
 #include "flac/FlacPcmEncoder.h"
 #include "flac/FlacStreamHeader.h"
-#include "writer/DeviceItems.h"
+#include "writer/WriterDeviceItems.h"
 #include "writer/PcmLayout.h"
 #include "writer/SingleSourceWriter.h"
 
@@ -83,13 +84,13 @@ struct FLACWriter::Impl : public SingleSourceWriter::Format {
     status_t writeStreamHeader(ByteSink& sink, const FlacStreamHeader& header);
     // The waveform block (when there is one) and a PADDING block of
     // `paddingBody` bytes, or no padding when it is negative.
-    bool buildTail(const DeviceItems::Snapshot& items, long paddingBody, std::vector<uint8_t>* out) const;
-    status_t replaceTail(ByteSink& sink, const DeviceItems::Snapshot& items);
+    bool buildTail(const WriterDeviceItems::Snapshot& items, long paddingBody, std::vector<uint8_t>* out) const;
+    status_t replaceTail(ByteSink& sink, const WriterDeviceItems::Snapshot& items);
     status_t writeFrame(ByteSink& sink, const uint8_t* data, size_t size);
     bool headerFromTrack(const FlacFrameHeader* frame, FlacStreamHeader* out) const;
     void frameStatistics(FlacStreamInfo* info) const;
 
-    DeviceItems items{"FLACWriter"};
+    WriterDeviceItems items{"FLACWriter"};
     bool pcmInput = false;
     PcmLayout layout;
     sp<MetaData> trackFormat;
@@ -136,7 +137,7 @@ status_t FLACWriter::Impl::checkSource(const sp<MetaData>& format) {
     return OK;
 }
 
-bool FLACWriter::Impl::buildTail(const DeviceItems::Snapshot& s, long paddingBody, std::vector<uint8_t>* out) const {
+bool FLACWriter::Impl::buildTail(const WriterDeviceItems::Snapshot& s, long paddingBody, std::vector<uint8_t>* out) const {
     out->clear();
     if (s.hasWaveform &&
         !FlacStreamHeader::appendApplicationBlock(out, "wafm", paddingBody < 0, s.waveform.data(), s.waveform.size())) {
@@ -148,7 +149,7 @@ bool FLACWriter::Impl::buildTail(const DeviceItems::Snapshot& s, long paddingBod
 }
 
 status_t FLACWriter::Impl::writeStreamHeader(ByteSink& sink, const FlacStreamHeader& header) {
-    const DeviceItems::Snapshot s = items.snapshot();
+    const WriterDeviceItems::Snapshot s = items.snapshot();
     std::vector<uint8_t> out = {'f', 'L', 'a', 'C'};
     uint8_t body[FlacStreamInfo::kBodyBytes];
     header.info.serialize(body);
@@ -210,7 +211,7 @@ bool FLACWriter::Impl::headerFromTrack(const FlacFrameHeader* frame, FlacStreamH
     int32_t rate = 0, channels = 0, bits = 0;
     trackFormat->findInt32(kKeySampleRate, &rate);
     trackFormat->findInt32(kKeyChannelCount, &channels);
-    if (!trackFormat->findInt32(kKeyEditorBitsPerSample, &bits)) trackFormat->findInt32(kKeyBitsPerSample, &bits);
+    if (!trackFormat->findInt32(kKeyDeviceBitsPerSample, &bits)) trackFormat->findInt32(kKeyBitsPerSample, &bits);
     FlacStreamInfo& s = out->info;
     s.sampleRate = frame && frame->sampleRate ? frame->sampleRate : static_cast<uint32_t>(std::max(rate, 0));
     s.channels = frame ? frame->channels : static_cast<uint32_t>(std::max(channels, 0));
@@ -295,7 +296,7 @@ void FLACWriter::Impl::frameStatistics(FlacStreamInfo* s) const {
     memset(s->md5, 0, sizeof(s->md5));
 }
 
-status_t FLACWriter::Impl::replaceTail(ByteSink& sink, const DeviceItems::Snapshot& s) {
+status_t FLACWriter::Impl::replaceTail(ByteSink& sink, const WriterDeviceItems::Snapshot& s) {
     const size_t waveformBlock = s.hasWaveform ? 8 + s.waveform.size() : 0;
     std::vector<uint8_t> tail;
     bool built;
@@ -338,7 +339,7 @@ status_t FLACWriter::Impl::finish(ByteSink& sink) {
     info.serialize(body);
     const status_t infoErr = sink.writeAt(kStreamInfoBodyOffset, body, sizeof(body));
     if (err == OK) err = infoErr;
-    const DeviceItems::Snapshot s = items.snapshot();
+    const WriterDeviceItems::Snapshot s = items.snapshot();
     if (s.hasWaveform != tailHasWaveform || s.waveform != tailWaveform) {
         const status_t tailErr = replaceTail(sink, s);
         if (err == OK) err = tailErr;

@@ -5,6 +5,8 @@
 #include <media/stagefright/MediaDefs.h>
 #include <media/stagefright/MediaErrors.h>
 
+#include "extractor/DeviceKeys.h"
+
 namespace android {
 
 namespace {
@@ -41,7 +43,7 @@ status_t PcmLayout::fromMetaData(const sp<MetaData>& meta, const char* owner, Pc
             ALOGE("%s: unsupported PCM encoding %d", owner, encoding);
             return ERROR_UNSUPPORTED;
         }
-    } else if (meta->findInt32(kKeyEditorBitsPerSample, &bits) || meta->findInt32(kKeyBitsPerSample, &bits)) {
+    } else if (meta->findInt32(kKeyDeviceBitsPerSample, &bits) || meta->findInt32(kKeyBitsPerSample, &bits)) {
         if (!sampleFromBits(bits, &layout.sample)) {
             ALOGE("%s: unsupported bits per sample %d", owner, bits);
             return ERROR_UNSUPPORTED;

@@ -8,10 +8,6 @@
 
 namespace android {
 
-// Not a platform key: the editor's muxer stores a track format's
-// "bits-per-sample" in the track metadata under this code.
-enum { kKeyEditorBitsPerSample = 'bPsp' };
-
 // How the bytes of a raw audio track's buffers are laid out: interleaved,
 // little-endian sample frames.
 struct PcmLayout {
@@ -28,7 +24,8 @@ struct PcmLayout {
 
     // The sample type comes from kKeyPcmEncoding when present (it names the
     // byte layout), else from the bits per sample ('bPsp', then 'sbit'; 24
-    // means packed), else 16-bit. Channel count and sample rate are required.
+    // means packed), else 16-bit. 'bPsp' is where the editor's muxer keeps a
+    // track format's "bits-per-sample". Channel count and sample rate are required.
     // OK, or BAD_VALUE / ERROR_UNSUPPORTED with a log line under `owner`.
     static status_t fromMetaData(const sp<MetaData>& meta, const char* owner, PcmLayout* out);
 };

@@ -5,7 +5,7 @@
 #include <media/stagefright/MediaErrors.h>
 
 #include "LogCapture.h"
-#include "amr/AMRFrameTable.h"
+#include "amr/AMRFrames.h"
 #include "writers/AudioWriterTestSupport.h"
 
 using namespace android;
@@ -23,9 +23,9 @@ sp<MetaData> amrFormat(const char* mime) {
 
 // One stored frame of a type: its header byte (quality bit set) and payload.
 Bytes frame(bool wideband, unsigned type, uint8_t fill) {
-    const int payload = AMRFrameTable::payloadBytes(wideband, type);
-    Bytes f(1 + static_cast<size_t>(payload > 0 ? payload : 0), fill);
-    f[0] = uint8_t((type << 3) | 0x04);
+    const uint8_t header = uint8_t((type << 3) | 0x04);
+    Bytes f(AMRFrameSize(wideband, header), fill);
+    f[0] = header;
     return f;
 }
 

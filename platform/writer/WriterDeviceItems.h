@@ -1,5 +1,5 @@
-#ifndef DEVICE_ITEMS_H_
-#define DEVICE_ITEMS_H_
+#ifndef WRITER_DEVICE_ITEMS_H_
+#define WRITER_DEVICE_ITEMS_H_
 
 #include <cstdint>
 #include <mutex>
@@ -19,7 +19,7 @@ namespace android {
 // (seal()); setters after that answer INVALID_OPERATION. The waveform is
 // computed while the samples are written, so it is taken until the file is
 // finished (close()); later ones are ignored with a warning.
-class DeviceItems {
+class WriterDeviceItems {
 public:
     struct Snapshot {
         std::vector<uint8_t> waveform;  // 2 * count bytes, big-endian values
@@ -32,7 +32,7 @@ public:
         bool hasBookmarkSize = false;
     };
 
-    explicit DeviceItems(const char* owner) : mOwner(owner) {}
+    explicit WriterDeviceItems(const char* owner) : mOwner(owner) {}
 
     // Zero-terminated text; null is BAD_VALUE.
     status_t setUserMessage(const uint8_t* message);

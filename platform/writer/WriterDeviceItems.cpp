@@ -1,5 +1,5 @@
-#define LOG_TAG "DeviceItems"
-#include "writer/DeviceItems.h"
+#define LOG_TAG "WriterDeviceItems"
+#include "writer/WriterDeviceItems.h"
 
 #include <cstring>
 
@@ -11,13 +11,13 @@ namespace {
 const char kBookmarkSizeKey[] = "bookmark-size";
 }  // namespace
 
-status_t DeviceItems::checkOpen(const char* what) const {
+status_t WriterDeviceItems::checkOpen(const char* what) const {
     if (!mSealed) return OK;
     ALOGE("%s: %s after start", mOwner, what);
     return INVALID_OPERATION;
 }
 
-status_t DeviceItems::setUserMessage(const uint8_t* message) {
+status_t WriterDeviceItems::setUserMessage(const uint8_t* message) {
     if (message == nullptr) return BAD_VALUE;
     std::lock_guard<std::mutex> lock(mLock);
     const status_t err = checkOpen("setUserMessage");
@@ -27,7 +27,7 @@ status_t DeviceItems::setUserMessage(const uint8_t* message) {
     return OK;
 }
 
-status_t DeviceItems::setRecMode(int kind, const String8& text) {
+status_t WriterDeviceItems::setRecMode(int kind, const String8& text) {
     std::lock_guard<std::mutex> lock(mLock);
     const status_t err = checkOpen("setAudioRecodingMeta");
     if (err != OK) return err;
@@ -37,7 +37,7 @@ status_t DeviceItems::setRecMode(int kind, const String8& text) {
     return OK;
 }
 
-status_t DeviceItems::setRecordingParams(const sp<AMessage>& params) {
+status_t WriterDeviceItems::setRecordingParams(const sp<AMessage>& params) {
     if (params == nullptr) return BAD_VALUE;
     std::lock_guard<std::mutex> lock(mLock);
     const status_t err = checkOpen("setRecodingParams");
@@ -54,7 +54,7 @@ status_t DeviceItems::setRecordingParams(const sp<AMessage>& params) {
     return OK;
 }
 
-void DeviceItems::setWaveform(const uint8_t* data, int count) {
+void WriterDeviceItems::setWaveform(const uint8_t* data, int count) {
     std::lock_guard<std::mutex> lock(mLock);
     if (mClosed) {
         ALOGW("%s: waveform after the file was finished, ignored", mOwner);
@@ -70,18 +70,18 @@ void DeviceItems::setWaveform(const uint8_t* data, int count) {
     mItems.hasWaveform = true;
 }
 
-void DeviceItems::seal() {
+void WriterDeviceItems::seal() {
     std::lock_guard<std::mutex> lock(mLock);
     mSealed = true;
 }
 
-void DeviceItems::close() {
+void WriterDeviceItems::close() {
     std::lock_guard<std::mutex> lock(mLock);
     mSealed = true;
     mClosed = true;
 }
 
-DeviceItems::Snapshot DeviceItems::snapshot() const {
+WriterDeviceItems::Snapshot WriterDeviceItems::snapshot() const {
     std::lock_guard<std::mutex> lock(mLock);
     return mItems;
 }

@@ -5,6 +5,7 @@
 
 #include <kestro/Kestro.h>
 
+#include "LogCapture.h"
 #include "writers/AudioWriterTestSupport.h"
 
 using namespace android;
@@ -48,7 +49,9 @@ TEST(KestroTest, ReadsTheSettingsFile) {
         "empty = later wins\n");
     Kestro* store = Kestro::getInstance();
     ASSERT_NE(nullptr, store);
+    LogCapture logs;
     store->setSettingsPath(file.path().c_str());
+    EXPECT_TRUE(logs.containsAt(ANDROID_LOG_WARN, ":7: not a setting"));
     EXPECT_EQ(nullptr, store->getFeatureInfo(1));
     KestroFeatureInfo* info = store->getFeatureInfo(2);
     ASSERT_NE(nullptr, info);

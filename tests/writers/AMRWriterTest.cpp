@@ -1,11 +1,14 @@
 #include <gtest/gtest.h>
 
 #include <media/stagefright/AMRWriter.h>
+#include <media/stagefright/FileSource.h>
 #include <media/stagefright/MediaDefs.h>
 #include <media/stagefright/MediaErrors.h>
 
 #include "LogCapture.h"
 #include "amr/AMRFrames.h"
+#include "extractor/Sniffers.h"
+#include "extractors/AudioMediaFacts.h"
 #include "writers/AudioWriterTestSupport.h"
 
 using namespace android;
@@ -129,4 +132,29 @@ TEST(AMRWriterTest, RefusalsAndTheEmptyFile) {
     EXPECT_EQ(OK, writer->stop());
     const Bytes f = file.bytes();
     EXPECT_EQ("#!AMR-WB\n", std::string(f.begin(), f.end()));
+}
+
+TEST(AMRWriterTest, TheAmrExtractorReadsBackEveryFrame) {
+    ScratchFile file(".amr");
+    sp<AMRWriter> writer = new AMRWriter(file.fd);
+    sp<MediaAdapter> source = makeSource(amrFormat(MEDIA_MIMETYPE_AUDIO_AMR_NB));
+    ASSERT_EQ(OK, writer->addSource(source));
+    ASSERT_EQ(OK, writer->start());
+    Bytes frames;
+    for (int i = 0; i < 60; ++i) {
+        const Bytes f = frame(false, i % 9, uint8_t(i));  // speech modes and SID
+        push(source, f, i * 20000);
+        frames.insert(frames.end(), f.begin(), f.end());
+    }
+    ASSERT_EQ(OK, writer->stop());
+
+    sp<IMediaExtractor> extractor = CreateAMRExtractor(new FileSource(file.path().c_str()));
+    ASSERT_NE(nullptr, extractor);
+    sp<IMediaSource> track = extractor->getTrack(0);
+    ASSERT_EQ(OK, track->start());
+    std::vector<audiotest::Sample> samples;
+    EXPECT_EQ(ERROR_END_OF_STREAM, audiotest::ReadSamples(track, &samples));
+    track->stop();
+    EXPECT_EQ(60u, samples.size());
+    EXPECT_TRUE(audiotest::Concat(samples) == frames);
 }

@@ -4,9 +4,14 @@
 #include <map>
 
 #include <media/stagefright/MediaDefs.h>
+#include <media/stagefright/FileSource.h>
 #include <media/stagefright/MediaErrors.h>
 #include <media/stagefright/QNWAVEWriter.h>
 
+#include "LogCapture.h"
+#include "extractor/DeviceKeys.h"
+#include "extractor/Sniffers.h"
+#include "extractors/AudioMediaFacts.h"
 #include "writers/AudioWriterTestSupport.h"
 #include "writers/WaveChunks.h"
 
@@ -214,6 +219,7 @@ TEST(WAVEWriterTest, EmptyStreamsEmptySamplesAndOddSizesLeaveValidFiles) {
 }
 
 TEST(WAVEWriterTest, RefusesWhatItCannotWrite) {
+    LogCapture logs;
     // A descriptor open for reading only: start fails, stop repeats it.
     ScratchFile file(".wav");
     const int readOnly = open(file.path().c_str(), O_RDONLY);
@@ -223,6 +229,7 @@ TEST(WAVEWriterTest, RefusesWhatItCannotWrite) {
     const status_t err = writer->start();
     EXPECT_NE(OK, err);
     EXPECT_EQ(err, writer->stop());
+    EXPECT_TRUE(logs.containsAt(ANDROID_LOG_ERROR, "is not writable"));
     close(readOnly);
 
     sp<QNWAVEWriter> other = new QNWAVEWriter(file.fd);
@@ -259,7 +266,9 @@ TEST(WAVEWriterTest, WaveformComputedDuringTheWriteIsStored) {
     const uint8_t waveform[] = {0x12, 0x34};
     writer->setWaveform(waveform, 1);
     ASSERT_EQ(OK, writer->stop());
+    LogCapture logs;
     writer->setWaveform(waveform, 1);  // after the file is done: ignored
+    EXPECT_TRUE(logs.containsAt(ANDROID_LOG_WARN, "waveform after the file was finished"));
 
     const Bytes f = file.bytes();
     const std::vector<Chunk> chunks = riffChunks(f);
@@ -279,4 +288,43 @@ TEST(WAVEWriterTest, DataIsCappedSoTheRiffSizeFits) {
     EXPECT_LE(36 + max + 1 + 100, 0xFFFFFFFFull);
     EXPECT_GT(36 + max + 4 + 1 + 100, 0xFFFFFFFFull);
     EXPECT_EQ(0u, WaveChunks::maxDataBytes(44, 0xFFFFFFFFull, 4));
+}
+
+TEST(WAVEWriterTest, TheWaveExtractorReadsBackSamplesAndItems) {
+    ScratchFile file(".wav");
+    sp<QNWAVEWriter> writer = new QNWAVEWriter(file.fd);
+    const uint8_t waveform[] = {0x00, 0x01, 0x80, 0x00};
+    writer->setWaveform(waveform, 2);
+    writer->setUserMessage(reinterpret_cast<const uint8_t*>("note"));
+    writer->setAudioRecodingMeta(0, String8("interview"));
+    sp<AMessage> params = new AMessage;
+    params->setInt64("bookmark-size", 123456789012LL);
+    writer->setRecodingParams(params);
+    Bytes pcm(3 * 2 * 4800);
+    for (size_t i = 0; i < pcm.size(); ++i) pcm[i] = uint8_t(i * 7);
+    ASSERT_EQ(OK, writeWave(writer, pcmFormat(2, 48000, kAudioEncodingPcm24bitPacked), pcm, 600));
+
+    sp<IMediaExtractor> extractor = CreateWAVExtractor(new FileSource(file.path().c_str()));
+    ASSERT_NE(nullptr, extractor);
+    sp<MetaData> fileMeta = extractor->getMetaData();
+    const void* data;
+    size_t size;
+    uint32_t type;
+    ASSERT_TRUE(fileMeta->findData(kKeyDeviceWaveForm, &type, &data, &size));
+    EXPECT_EQ(Bytes(waveform, waveform + 4), Bytes(static_cast<const uint8_t*>(data), static_cast<const uint8_t*>(data) + size));
+    const char* text;
+    ASSERT_TRUE(fileMeta->findCString(kKeyDeviceUserMessage, &text));
+    EXPECT_STREQ("note", text);
+    ASSERT_TRUE(fileMeta->findCString(kKeyDeviceRecMode, &text));
+    EXPECT_STREQ("interview", text);
+    int64_t bookmark = 0;
+    EXPECT_TRUE(extractor->getTrackMetaData(0)->findInt64(kKeyDeviceBookmarkSize, &bookmark));
+    EXPECT_EQ(123456789012LL, bookmark);
+
+    sp<IMediaSource> track = extractor->getTrack(0);
+    ASSERT_EQ(OK, track->start());
+    std::vector<audiotest::Sample> samples;
+    EXPECT_EQ(ERROR_END_OF_STREAM, audiotest::ReadSamples(track, &samples));
+    track->stop();
+    EXPECT_TRUE(audiotest::Concat(samples) == pcm);
 }

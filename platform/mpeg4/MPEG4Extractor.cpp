@@ -1,7 +1,169 @@
-// Placeholder until the extractor lands.
+#define LOG_TAG "MPEG4Extractor"
+#include "mpeg4/MPEG4Extractor.h"
+
+#include <algorithm>
+
+#include <log/log.h>
+#include <media/stagefright/MediaDefs.h>
+#include <media/stagefright/MediaErrors.h>
+
 #include "extractor/Sniffers.h"
+#include "mpeg4/MPEG4Box.h"
+#include "mpeg4/MPEG4EditorKeys.h"
+#include "mpeg4/MPEG4Source.h"
+#include "mpeg4/MPEG4UserData.h"
 
 namespace android {
-float SniffMPEG4(const sp<DataSource>&) { return 0.0f; }
-sp<IMediaExtractor> CreateMPEG4Extractor(const sp<DataSource>&) { return nullptr; }
+
+using mpeg4::FourCC;
+
+namespace {
+
+// The index is held in memory while it is parsed; real ones stay far below.
+constexpr uint64_t kMaxIndexBytes = 256 * 1024 * 1024;
+constexpr uint64_t kMaxUuidBytes = 16 * 1024 * 1024;
+// Files are a handful of boxes at the top; a long run of them is not an MP4.
+constexpr int kMaxTopLevelBoxes = 4096;
+
+bool ReadMovieHeader(ByteReader r, uint32_t* timescale) {
+    uint8_t version;
+    uint32_t flags;
+    return mpeg4::ReadFullBoxHeader(&r, &version, &flags) && r.skip(version == 1 ? 16 : 8) && r.be32(timescale);
+}
+
+}  // namespace
+
+MPEG4Extractor::MPEG4Extractor(const sp<DataSource>& source) : mDataSource(source) {
+    mInitCheck = readFile();
+}
+
+status_t MPEG4Extractor::readFile() {
+    if (mDataSource->getSize(&mFileSize) != OK || mFileSize <= 0) {
+        ALOGE("the file size is unknown");
+        return ERROR_UNSUPPORTED;
+    }
+    bool haveMovie = false;
+    off64_t offset = 0;
+    for (int boxes = 0; boxes < kMaxTopLevelBoxes && mFileSize - offset >= 8; ++boxes) {
+        mpeg4::BoxHeader box;
+        status_t err = mpeg4::ReadTopLevelBoxHeader(mDataSource, offset, mFileSize, &box);
+        if (err != OK) {
+            if (haveMovie) break;
+            ALOGW("unreadable box at %lld", (long long)offset);
+            return ERROR_MALFORMED;
+        }
+        const bool truncated = box.size > uint64_t(mFileSize - offset);
+        if (box.type == FourCC('m', 'o', 'o', 'v') && !haveMovie) {
+            if (truncated || box.payloadSize() > kMaxIndexBytes) {
+                ALOGW("movie box of %llu bytes at %lld does not fit", (unsigned long long)box.size, (long long)offset);
+                return ERROR_MALFORMED;
+            }
+            std::vector<uint8_t> moov(box.payloadSize());
+            if (!mDataSource->readExactly(offset + box.headerSize, moov.data(), moov.size())) return ERROR_IO;
+            if ((err = readMovie(ByteReader(moov.data(), moov.size()))) != OK) return err;
+            haveMovie = true;
+        } else if (box.type == FourCC('u', 'u', 'i', 'd') && !truncated && mpeg4::IsSphereViewUuid(box.userType)) {
+            readSphereView(offset + box.headerSize, box.payloadSize());
+        }
+        if (truncated) break;
+        offset += static_cast<off64_t>(box.size);
+    }
+    if (!haveMovie) {
+        ALOGW("no movie box");
+        return ERROR_MALFORMED;
+    }
+    return OK;
+}
+
+void MPEG4Extractor::readSphereView(off64_t offset, uint64_t size) {
+    if (size > kMaxUuidBytes) {
+        ALOGW("sphere view data of %llu bytes ignored", (unsigned long long)size);
+        return;
+    }
+    std::vector<uint8_t> data(size);
+    if (!mDataSource->readExactly(offset, data.data(), data.size())) return;
+    mpeg4::SetSphereView(mFileMeta.get(), data.data(), data.size());
+}
+
+status_t MPEG4Extractor::readMovie(const ByteReader& moov) {
+    uint32_t movieTimescale = 0;
+    ByteReader box(nullptr, 0);
+    if (!mpeg4::FindChild(moov, FourCC('m', 'v', 'h', 'd'), &box) || !ReadMovieHeader(box, &movieTimescale)) {
+        ALOGW("no usable movie header");
+        return ERROR_MALFORMED;
+    }
+    mpeg4::BoxIterator it(moov);
+    while (it.next()) {
+        if (it.header().type != FourCC('t', 'r', 'a', 'k')) continue;
+        auto track = std::make_shared<mpeg4::Track>();
+        const status_t err = mpeg4::ParseTrack(it.payload(), movieTimescale, track.get());
+        if (err == ERROR_UNSUPPORTED) continue;
+        if (err != OK) return err;
+        mTracks.push_back(track);
+    }
+    if (it.malformed()) return ERROR_MALFORMED;
+    if (mTracks.empty()) {
+        ALOGW("no track this extractor can hand out");
+        return ERROR_UNSUPPORTED;
+    }
+
+    mpeg4::UserData userData;
+    if (mpeg4::FindChild(moov, FourCC('u', 'd', 't', 'a'), &box)) {
+        mpeg4::ParseUserData(box, mFileMeta.get(), &userData);
+    }
+    int64_t durationUs = 0;
+    for (const auto& track : mTracks) {
+        int64_t trackUs;
+        if (track->meta->findInt64(kKeyDuration, &trackUs)) durationUs = std::max(durationUs, trackUs);
+        if (track->isAudio && userData.hasBookmarkSize) {
+            track->meta->setInt64(mpeg4::kEditorKeyBookmarkSize, userData.bookmarkSize);
+        }
+    }
+    mFileMeta->setCString(kKeyMIMEType, MEDIA_MIMETYPE_CONTAINER_MPEG4);
+    mFileMeta->setInt64(kKeyDuration, durationUs);
+    return OK;
+}
+
+size_t MPEG4Extractor::countTracks() { return mTracks.size(); }
+
+sp<IMediaSource> MPEG4Extractor::getTrack(size_t index) {
+    if (index >= mTracks.size()) return nullptr;
+    return new MPEG4Source(mDataSource, mTracks[index], mFileSize);
+}
+
+sp<MetaData> MPEG4Extractor::getTrackMetaData(size_t index, uint32_t) {
+    if (index >= mTracks.size()) return nullptr;
+    return mTracks[index]->meta;
+}
+
+sp<MetaData> MPEG4Extractor::getMetaData() { return mFileMeta; }
+
+float SniffMPEG4(const sp<DataSource>& source) {
+    uint8_t header[8];
+    if (source == nullptr || !source->readExactly(0, header, sizeof(header))) return 0.0f;
+    ByteReader r(header, sizeof(header));
+    uint32_t size, type;
+    r.be32(&size);
+    r.be32(&type);
+    if (type == FourCC('f', 't', 'y', 'p')) return size >= 8 ? 0.5f : 0.0f;
+    // Files without a file-type box start straight with one of these.
+    switch (type) {
+        case FourCC('m', 'o', 'o', 'v'):
+        case FourCC('m', 'd', 'a', 't'):
+        case FourCC('f', 'r', 'e', 'e'):
+        case FourCC('s', 'k', 'i', 'p'):
+        case FourCC('w', 'i', 'd', 'e'):
+            return (size == 0 || size == 1 || size >= 8) ? 0.2f : 0.0f;
+        default:
+            return 0.0f;
+    }
+}
+
+sp<IMediaExtractor> CreateMPEG4Extractor(const sp<DataSource>& source) {
+    if (source == nullptr) return nullptr;
+    sp<MPEG4Extractor> extractor = new MPEG4Extractor(source);
+    if (extractor->initCheck() != OK) return nullptr;
+    return extractor;
+}
+
 }  // namespace android

@@ -1,0 +1,334 @@
+#define LOG_TAG "MPEG4SampleTable"
+#include "mpeg4/MPEG4SampleTable.h"
+
+#include <algorithm>
+
+#include <log/log.h>
+#include <media/stagefright/MediaErrors.h>
+
+#include "mpeg4/MPEG4Box.h"
+
+namespace android {
+namespace mpeg4 {
+
+namespace {
+
+// Decoding times are kept well inside int64 so that adding composition
+// offsets and edit shifts cannot overflow.
+constexpr int64_t kMaxTicks = INT64_MAX / 4;
+
+// Full-box header and a 32-bit entry count, then `entryBytes` per entry.
+bool ReadTableHeader(ByteReader* r, uint32_t* count, uint64_t entryBytes) {
+    uint8_t version;
+    uint32_t flags;
+    if (!ReadFullBoxHeader(r, &version, &flags) || !r->be32(count)) return false;
+    return r->has(uint64_t(*count) * entryBytes);
+}
+
+status_t Malformed(const char* what) {
+    ALOGW("malformed sample table: %s", what);
+    return ERROR_MALFORMED;
+}
+
+}  // namespace
+
+status_t SampleTable::setSampleSizes(uint32_t type, ByteReader r) {
+    uint8_t version;
+    uint32_t flags;
+    if (!ReadFullBoxHeader(&r, &version, &flags)) return Malformed("short size table");
+    if (type == FourCC('s', 't', 'z', '2')) {
+        uint8_t reserved[3], fieldSize;
+        if (!r.read(reserved, 3) || !r.u8(&fieldSize) || !r.be32(&mCount)) return Malformed("short stz2");
+        if (fieldSize != 4 && fieldSize != 8 && fieldSize != 16) return Malformed("stz2 field size");
+        mSizeBits = fieldSize;
+    } else {
+        if (!r.be32(&mFixedSize) || !r.be32(&mCount)) return Malformed("short stsz");
+        mSizeBits = mFixedSize == 0 ? 32 : 0;
+    }
+    const uint64_t bytes = (uint64_t(mCount) * mSizeBits + 7) / 8;
+    if (!r.has(bytes)) return Malformed("more sample sizes than the box holds");
+    mSizes.assign(r.current(), r.current() + bytes);
+    mHaveSizes = true;
+    return OK;
+}
+
+status_t SampleTable::setChunkOffsets(uint32_t type, ByteReader r) {
+    mChunkOffsetBytes = type == FourCC('c', 'o', '6', '4') ? 8 : 4;
+    if (!ReadTableHeader(&r, &mChunkCount, mChunkOffsetBytes)) {
+        return Malformed("more chunk offsets than the box holds");
+    }
+    mChunkOffsets.assign(r.current(), r.current() + uint64_t(mChunkCount) * mChunkOffsetBytes);
+    mHaveChunks = true;
+    return OK;
+}
+
+status_t SampleTable::setSampleToChunk(ByteReader r) {
+    uint32_t count;
+    if (!ReadTableHeader(&r, &count, 12)) return Malformed("more sample-to-chunk entries than the box holds");
+    mChunkRuns.reserve(count);
+    uint32_t previous = 0;
+    for (uint32_t i = 0; i < count; ++i) {
+        uint32_t firstChunk = 0, perChunk = 0, description = 0;
+        r.be32(&firstChunk);
+        r.be32(&perChunk);
+        r.be32(&description);
+        if (firstChunk <= previous) return Malformed("sample-to-chunk entries out of order");
+        previous = firstChunk;
+        mChunkRuns.push_back({0, firstChunk - 1, 0, perChunk});
+    }
+    mHaveSampleToChunk = true;
+    return OK;
+}
+
+status_t SampleTable::setTimeToSample(ByteReader r) {
+    uint32_t count;
+    if (!ReadTableHeader(&r, &count, 8)) return Malformed("more time-to-sample entries than the box holds");
+    mTimeRuns.reserve(count);
+    for (uint32_t i = 0; i < count; ++i) {
+        uint32_t samples = 0, delta = 0;
+        r.be32(&samples);
+        r.be32(&delta);
+        if (samples > 0) mTimeRuns.push_back({0, 0, samples, delta});
+    }
+    mHaveTimes = true;
+    return OK;
+}
+
+status_t SampleTable::setCompositionOffsets(ByteReader r) {
+    uint32_t count;
+    if (!ReadTableHeader(&r, &count, 8)) return Malformed("more composition offsets than the box holds");
+    mOffsetRuns.reserve(count);
+    for (uint32_t i = 0; i < count; ++i) {
+        uint32_t samples = 0, offset = 0;
+        r.be32(&samples);
+        r.be32(&offset);
+        // Version 0 declares the offsets unsigned, but writers store negative
+        // ones there too; an offset of 2^31 ticks or more is never meant.
+        if (samples > 0) mOffsetRuns.push_back({0, samples, static_cast<int32_t>(offset)});
+    }
+    return OK;
+}
+
+status_t SampleTable::setSyncSamples(ByteReader r) {
+    uint32_t count;
+    if (!ReadTableHeader(&r, &count, 4)) return Malformed("more sync samples than the box holds");
+    mSyncSamples.reserve(count);
+    for (uint32_t i = 0; i < count; ++i) {
+        uint32_t number = 0;
+        r.be32(&number);
+        if (number > 0) mSyncSamples.push_back(number - 1);
+    }
+    mHaveSyncTable = true;
+    return OK;
+}
+
+uint32_t SampleTable::sampleSize(uint32_t i) const {
+    const uint8_t* p = mSizes.data();
+    switch (mSizeBits) {
+        case 32:
+            p += size_t(i) * 4;
+            return (uint32_t(p[0]) << 24) | (uint32_t(p[1]) << 16) | (uint32_t(p[2]) << 8) | p[3];
+        case 16:
+            p += size_t(i) * 2;
+            return (uint32_t(p[0]) << 8) | p[1];
+        case 8:
+            return p[i];
+        case 4:
+            return (i & 1) ? (p[i / 2] & 0x0F) : (p[i / 2] >> 4);
+        default:
+            return mFixedSize;
+    }
+}
+
+uint64_t SampleTable::chunkOffset(uint32_t chunk) const {
+    const uint8_t* p = mChunkOffsets.data() + size_t(chunk) * mChunkOffsetBytes;
+    uint64_t v = 0;
+    for (uint32_t i = 0; i < mChunkOffsetBytes; ++i) v = (v << 8) | p[i];
+    return v;
+}
+
+status_t SampleTable::indexTimes() {
+    uint64_t sample = 0;
+    int64_t dts = 0;
+    size_t kept = 0;
+    for (; kept < mTimeRuns.size() && sample < mCount; ++kept) {
+        TimeRun& run = mTimeRuns[kept];
+        run.firstSample = sample;
+        run.firstDts = dts;
+        const uint64_t span = uint64_t(run.count) * run.delta;
+        if (span > uint64_t(kMaxTicks - dts)) return Malformed("decoding times overflow");
+        sample += run.count;
+        dts += static_cast<int64_t>(span);
+    }
+    mTimeRuns.resize(kept);
+    if (sample < mCount) {
+        // Fewer durations than samples: the last one goes on.
+        if (mTimeRuns.empty()) return Malformed("no sample durations");
+        TimeRun& last = mTimeRuns.back();
+        const uint64_t missing = mCount - sample;
+        if (missing * last.delta > uint64_t(kMaxTicks - dts)) return Malformed("decoding times overflow");
+        ALOGW("time-to-sample table covers %llu of %u samples", (unsigned long long)sample, mCount);
+        last.count += static_cast<uint32_t>(missing);
+        dts += static_cast<int64_t>(missing * last.delta);
+        sample = mCount;
+    }
+    // Runs may list more samples than the size table; the end is the last sample's.
+    if (!mTimeRuns.empty()) {
+        const TimeRun& last = mTimeRuns.back();
+        mEndDts = last.firstDts + static_cast<int64_t>((mCount - last.firstSample) * uint64_t(last.delta));
+    }
+
+    sample = 0;
+    kept = 0;
+    for (; kept < mOffsetRuns.size() && sample < mCount; ++kept) {
+        mOffsetRuns[kept].firstSample = sample;
+        sample += mOffsetRuns[kept].count;
+    }
+    mOffsetRuns.resize(kept);
+    return OK;
+}
+
+status_t SampleTable::indexChunks() {
+    std::vector<ChunkRun> kept;
+    kept.reserve(mChunkRuns.size());
+    uint64_t sample = 0;
+    for (size_t i = 0; i < mChunkRuns.size() && sample < mCount; ++i) {
+        ChunkRun run = mChunkRuns[i];
+        if (run.firstChunk >= mChunkCount) break;
+        run.chunkEnd = i + 1 < mChunkRuns.size() ? std::min(mChunkRuns[i + 1].firstChunk, mChunkCount)
+                                                 : mChunkCount;
+        if (run.samplesPerChunk == 0) continue;
+        run.firstSample = sample;
+        sample += uint64_t(run.chunkEnd - run.firstChunk) * run.samplesPerChunk;
+        kept.push_back(run);
+    }
+    if (sample < mCount) return Malformed("chunks hold fewer samples than the size table lists");
+    mChunkRuns.swap(kept);
+    return OK;
+}
+
+status_t SampleTable::finish() {
+    if (!mHaveSizes) return Malformed("no sample sizes");
+    if (mCount == 0) {
+        mChunkRuns.clear();
+        mTimeRuns.clear();
+        mOffsetRuns.clear();
+        mSyncSamples.clear();
+        return OK;
+    }
+    if (!mHaveChunks || !mHaveSampleToChunk || !mHaveTimes) return Malformed("a table is missing");
+    status_t err = indexTimes();
+    if (err != OK) return err;
+    err = indexChunks();
+    if (err != OK) return err;
+
+    if (mSizeBits == 0) {
+        mMaxSize = mFixedSize;
+        mTotalBytes = uint64_t(mFixedSize) * mCount;
+    } else {
+        for (uint32_t i = 0; i < mCount; ++i) {
+            const uint32_t size = sampleSize(i);
+            mMaxSize = std::max(mMaxSize, size);
+            mTotalBytes += size;
+        }
+    }
+    if (mHaveSyncTable) {
+        std::sort(mSyncSamples.begin(), mSyncSamples.end());
+        mSyncSamples.erase(std::unique(mSyncSamples.begin(), mSyncSamples.end()), mSyncSamples.end());
+        mSyncSamples.erase(std::lower_bound(mSyncSamples.begin(), mSyncSamples.end(), mCount),
+                           mSyncSamples.end());
+    }
+    return OK;
+}
+
+namespace {
+// The last run starting at or before `sample`.
+template <typename Run>
+size_t FindRun(const std::vector<Run>& runs, uint64_t sample) {
+    auto it = std::upper_bound(runs.begin(), runs.end(), sample,
+                               [](uint64_t s, const Run& run) { return s < run.firstSample; });
+    return static_cast<size_t>(it - runs.begin()) - 1;
+}
+}  // namespace
+
+bool SampleCursor::seek(uint32_t index) {
+    mIndex = index;
+    if (!valid()) return false;
+    const SampleTable& t = mTable;
+
+    mTimeRun = FindRun(t.mTimeRuns, index);
+    const SampleTable::TimeRun& time = t.mTimeRuns[mTimeRun];
+    mTimeInRun = static_cast<uint32_t>(index - time.firstSample);
+    mInfo.dts = time.firstDts + static_cast<int64_t>(uint64_t(mTimeInRun) * time.delta);
+
+    mOffsetRun = t.mOffsetRuns.empty() ? 0 : FindRun(t.mOffsetRuns, index);
+    mOffsetInRun = 0;
+    mInfo.ctsOffset = 0;
+    if (mOffsetRun < t.mOffsetRuns.size()) {
+        const SampleTable::OffsetRun& run = t.mOffsetRuns[mOffsetRun];
+        if (index - run.firstSample < run.count) {
+            mOffsetInRun = static_cast<uint32_t>(index - run.firstSample);
+            mInfo.ctsOffset = run.offset;
+        } else {
+            mOffsetRun = t.mOffsetRuns.size();
+        }
+    }
+
+    mChunkRun = FindRun(t.mChunkRuns, index);
+    const SampleTable::ChunkRun& chunks = t.mChunkRuns[mChunkRun];
+    const uint64_t relative = index - chunks.firstSample;
+    mChunk = chunks.firstChunk + static_cast<uint32_t>(relative / chunks.samplesPerChunk);
+    mInChunk = static_cast<uint32_t>(relative % chunks.samplesPerChunk);
+    mInfo.offset = t.chunkOffset(mChunk);
+    for (uint32_t i = index - mInChunk; i < index; ++i) mInfo.offset += t.sampleSize(i);
+    mInfo.size = t.sampleSize(index);
+
+    mSyncPos = static_cast<size_t>(std::lower_bound(t.mSyncSamples.begin(), t.mSyncSamples.end(), index) -
+                                   t.mSyncSamples.begin());
+    loadSync();
+    return true;
+}
+
+void SampleCursor::advance() {
+    if (!valid()) return;
+    const SampleTable& t = mTable;
+    ++mIndex;
+    if (!valid()) return;
+
+    const SampleTable::TimeRun& time = t.mTimeRuns[mTimeRun];
+    mInfo.dts += time.delta;
+    if (++mTimeInRun == time.count) {
+        ++mTimeRun;
+        mTimeInRun = 0;
+    }
+
+    if (mOffsetRun < t.mOffsetRuns.size() && ++mOffsetInRun == t.mOffsetRuns[mOffsetRun].count) {
+        ++mOffsetRun;
+        mOffsetInRun = 0;
+    }
+    mInfo.ctsOffset = mOffsetRun < t.mOffsetRuns.size() ? t.mOffsetRuns[mOffsetRun].offset : 0;
+
+    const SampleTable::ChunkRun* chunks = &t.mChunkRuns[mChunkRun];
+    if (++mInChunk == chunks->samplesPerChunk) {
+        mInChunk = 0;
+        if (++mChunk == chunks->chunkEnd) {
+            chunks = &t.mChunkRuns[++mChunkRun];
+            mChunk = chunks->firstChunk;
+        }
+        mInfo.offset = t.chunkOffset(mChunk);
+    } else {
+        mInfo.offset += mInfo.size;
+    }
+    mInfo.size = t.sampleSize(mIndex);
+
+    while (mSyncPos < t.mSyncSamples.size() && t.mSyncSamples[mSyncPos] < mIndex) ++mSyncPos;
+    loadSync();
+}
+
+void SampleCursor::loadSync() {
+    mInfo.sync = !mTable.mHaveSyncTable ||
+                 (mSyncPos < mTable.mSyncSamples.size() && mTable.mSyncSamples[mSyncPos] == mIndex);
+}
+
+}  // namespace mpeg4
+}  // namespace android

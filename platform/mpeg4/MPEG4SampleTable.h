@@ -1,0 +1,127 @@
+#ifndef MPEG4_SAMPLE_TABLE_H_
+#define MPEG4_SAMPLE_TABLE_H_
+
+#include <cstdint>
+#include <vector>
+
+#include <media/stagefright/foundation/ByteReader.h>
+#include <utils/Errors.h>
+
+namespace android {
+namespace mpeg4 {
+
+struct SampleInfo {
+    uint64_t offset = 0;
+    uint32_t size = 0;
+    int64_t dts = 0;        // media timescale
+    int32_t ctsOffset = 0;  // composition minus decoding time
+    bool sync = false;
+};
+
+// The sample tables of one track (ISO/IEC 14496-12, 8.6 and 8.7), kept in the
+// compact form the file stores them in: what is held grows with the tables'
+// size in the file, never with a count the file merely claims.
+class SampleTable {
+public:
+    // Each takes the box payload and refuses one whose entries do not fit it.
+    status_t setSampleSizes(uint32_t type, ByteReader payload);   // 'stsz' or 'stz2'
+    status_t setChunkOffsets(uint32_t type, ByteReader payload);  // 'stco' or 'co64'
+    status_t setSampleToChunk(ByteReader payload);
+    status_t setTimeToSample(ByteReader payload);
+    status_t setCompositionOffsets(ByteReader payload);
+    status_t setSyncSamples(ByteReader payload);
+    // Checks that the tables agree and indexes the runs; ERROR_MALFORMED when
+    // a table is missing or cannot describe every sample.
+    status_t finish();
+
+    uint32_t count() const { return mCount; }
+    uint32_t sampleSize(uint32_t index) const;
+    uint32_t maxSampleSize() const { return mMaxSize; }
+    uint64_t totalBytes() const { return mTotalBytes; }
+    // Decoding time just past the last sample.
+    int64_t endDts() const { return mEndDts; }
+    // Sync samples in order; every sample when the track has no sync table.
+    uint32_t syncCount() const { return mHaveSyncTable ? uint32_t(mSyncSamples.size()) : mCount; }
+    uint32_t syncSample(uint32_t k) const { return mHaveSyncTable ? mSyncSamples[k] : k; }
+
+private:
+    friend class SampleCursor;
+
+    struct ChunkRun {
+        uint64_t firstSample;
+        uint32_t firstChunk;  // zero-based
+        uint32_t chunkEnd;    // one past the run's last chunk
+        uint32_t samplesPerChunk;
+    };
+    struct TimeRun {
+        uint64_t firstSample;
+        int64_t firstDts;
+        uint32_t count;
+        uint32_t delta;
+    };
+    struct OffsetRun {
+        uint64_t firstSample;
+        uint32_t count;
+        int32_t offset;
+    };
+
+    uint64_t chunkOffset(uint32_t chunk) const;
+    status_t indexTimes();
+    status_t indexChunks();
+
+    uint32_t mCount = 0;
+    bool mHaveSizes = false;
+    uint32_t mFixedSize = 0;
+    uint32_t mSizeBits = 0;  // width of a table entry; 0 with a fixed size
+    std::vector<uint8_t> mSizes;
+
+    bool mHaveChunks = false;
+    uint32_t mChunkCount = 0;
+    uint32_t mChunkOffsetBytes = 4;
+    std::vector<uint8_t> mChunkOffsets;
+
+    bool mHaveSampleToChunk = false;
+    std::vector<ChunkRun> mChunkRuns;
+    bool mHaveTimes = false;
+    std::vector<TimeRun> mTimeRuns;
+    std::vector<OffsetRun> mOffsetRuns;
+    bool mHaveSyncTable = false;
+    std::vector<uint32_t> mSyncSamples;  // zero-based, ascending
+
+    uint32_t mMaxSize = 0;
+    uint64_t mTotalBytes = 0;
+    int64_t mEndDts = 0;
+};
+
+// Walks a finished table: seek() to any sample, advance() to the next one in
+// constant time.
+class SampleCursor {
+public:
+    explicit SampleCursor(const SampleTable& table) : mTable(table) {}
+
+    bool seek(uint32_t index);
+    void advance();
+    bool valid() const { return mIndex < mTable.count(); }
+    uint32_t index() const { return mIndex; }
+    const SampleInfo& info() const { return mInfo; }
+
+private:
+    void loadSync();
+
+    const SampleTable& mTable;
+    uint32_t mIndex = UINT32_MAX;
+    size_t mTimeRun = 0;
+    uint32_t mTimeInRun = 0;
+    size_t mOffsetRun = 0;
+    uint32_t mOffsetInRun = 0;
+    size_t mChunkRun = 0;
+    uint32_t mChunk = 0;
+    uint32_t mInChunk = 0;
+    size_t mSyncPos = 0;
+    SampleInfo mInfo;
+};
+
+}  // namespace mpeg4
+}  // namespace android
+
+#endif

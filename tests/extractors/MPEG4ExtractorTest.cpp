@@ -1,0 +1,310 @@
+// The MP4 extractor against files made by ffmpeg (facts recorded by ffprobe)
+// and against files built here to reach the cases encoders do not write.
+
+#include <gtest/gtest.h>
+
+#include <fstream>
+#include <map>
+#include <sstream>
+#include <string>
+#include <vector>
+
+#include <media/stagefright/FileSource.h>
+#include <media/stagefright/MediaBufferBase.h>
+#include <media/stagefright/MediaDefs.h>
+#include <media/stagefright/MediaErrors.h>
+#include <media/stagefright/MediaExtractorFactory.h>
+
+#include "MPEG4TestFile.h"
+#include "extractor/Sniffers.h"
+
+using namespace android;
+using namespace mp4test;
+
+namespace {
+
+typedef MediaTrack::ReadOptions::SeekMode SeekMode;
+
+struct Packet {
+    int64_t pts, dts;
+    uint32_t size;
+    bool key;
+};
+struct Stream {
+    std::string codec;
+    int64_t durationUs;
+    int32_t width, height, rate, channels, rotationCcw;
+    std::vector<Packet> packets;
+};
+struct Facts {
+    int64_t durationUs = 0;
+    std::string location;
+    std::vector<Stream> streams;
+};
+
+std::string MediaPath(const std::string& name) { return std::string(ME_TEST_MEDIA_DIR) + "/mp4/" + name; }
+
+Facts LoadFacts(const std::string& name) {
+    Facts f;
+    std::ifstream in(MediaPath(name) + ".facts");
+    std::string line;
+    while (std::getline(in, line)) {
+        std::istringstream s(line);
+        std::string kind, tag;
+        s >> kind;
+        if (kind == "format") {
+            s >> f.durationUs >> f.location;
+        } else if (kind == "stream") {
+            Stream st;
+            int index;
+            s >> index >> st.codec >> tag >> st.durationUs >> st.width >> st.height >> st.rate >> st.channels >>
+                st.rotationCcw;
+            f.streams.push_back(st);
+        } else if (kind == "packet") {
+            size_t index;
+            int key;
+            Packet p;
+            s >> index >> p.pts >> p.dts >> p.size >> key;
+            p.key = key != 0;
+            if (index < f.streams.size()) f.streams[index].packets.push_back(p);
+        }
+    }
+    return f;
+}
+
+std::string ReadFile(const std::string& path) {
+    std::ifstream in(path, std::ios::binary);
+    return std::string(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
+}
+
+sp<IMediaExtractor> OpenBytes(const std::string& bytes) {
+    return CreateMPEG4Extractor(new BufferDataSource(bytes.data(), bytes.size()));
+}
+
+struct Read {
+    int64_t timeUs = 0, decodingUs = 0, targetUs = -1;
+    bool sync = false;
+    std::string bytes;
+};
+
+// One read; the buffer is given back before returning.
+status_t ReadOne(const sp<IMediaSource>& source, Read* out, const MediaTrack::ReadOptions* options = nullptr) {
+    MediaBufferBase* buffer = nullptr;
+    const status_t err = source->read(&buffer, options);
+    if (err != OK) {
+        EXPECT_EQ(nullptr, buffer);
+        return err;
+    }
+    MetaDataBase& meta = buffer->meta_data();
+    int32_t sync = 0;
+    EXPECT_TRUE(meta.findInt64(kKeyTime, &out->timeUs));
+    EXPECT_TRUE(meta.findInt64(kKeyDecodingTime, &out->decodingUs));
+    EXPECT_TRUE(meta.findInt32(kKeyIsSyncFrame, &sync));
+    if (!meta.findInt64(kKeyTargetTime, &out->targetUs)) out->targetUs = -1;
+    out->sync = sync != 0;
+    out->bytes.assign(static_cast<const char*>(buffer->data()) + buffer->range_offset(), buffer->range_length());
+    buffer->release();
+    return OK;
+}
+
+// Every sample until the first failure, whose status is returned.
+status_t ReadAll(const sp<IMediaSource>& source, std::vector<Read>* out, size_t limit = SIZE_MAX) {
+    status_t err = OK;
+    for (Read r; out->size() < limit && (err = ReadOne(source, &r)) == OK;) out->push_back(r);
+    return err;
+}
+
+std::string MimeOf(const std::string& codec) {
+    static const std::map<std::string, std::string> kMimes = {
+        {"h264", MEDIA_MIMETYPE_VIDEO_AVC}, {"hevc", MEDIA_MIMETYPE_VIDEO_HEVC},
+        {"aac", MEDIA_MIMETYPE_AUDIO_AAC}, {"amr_nb", MEDIA_MIMETYPE_AUDIO_AMR_NB}};
+    auto it = kMimes.find(codec);
+    return it == kMimes.end() ? "?" : it->second;
+}
+
+// Annex-B: start codes only at unit boundaries (emulation prevention keeps
+// them out of the payload), and each unit has its forbidden bit clear.
+void ExpectAnnexB(const std::string& s) {
+    ASSERT_GE(s.size(), 5u);
+    ASSERT_EQ(std::string("\0\0\0\1", 4), s.substr(0, 4));
+    for (size_t at = 0; at != std::string::npos; at = s.find(std::string("\0\0\0\1", 4), at + 4)) {
+        ASSERT_LT(at + 4, s.size());
+        EXPECT_EQ(0, s[at + 4] & 0x80);
+    }
+}
+
+int32_t IntOf(const sp<MetaData>& meta, uint32_t key) {
+    int32_t v = -1;
+    meta->findInt32(key, &v);
+    return v;
+}
+
+// -------------------------------------------------------------------------
+// Files made by ffmpeg
+
+class MPEG4FileTest : public ::testing::TestWithParam<const char*> {
+protected:
+    void SetUp() override {
+        mFacts = LoadFacts(GetParam());
+        ASSERT_FALSE(mFacts.streams.empty()) << "no facts for " << GetParam();
+        sp<DataSource> source = new FileSource(MediaPath(GetParam()).c_str());
+        ASSERT_EQ(OK, source->initCheck());
+        mExtractor = MediaExtractorFactory::Create(source, nullptr);
+        ASSERT_NE(nullptr, mExtractor);
+    }
+
+    Facts mFacts;
+    sp<IMediaExtractor> mExtractor;
+};
+
+TEST_P(MPEG4FileTest, FormatsMatchTheProbe) {
+    sp<MetaData> file = mExtractor->getMetaData();
+    const char* mime = nullptr;
+    int64_t durationUs = 0;
+    ASSERT_TRUE(file->findCString(kKeyMIMEType, &mime));
+    EXPECT_STREQ(MEDIA_MIMETYPE_CONTAINER_MPEG4, mime);
+    ASSERT_TRUE(file->findInt64(kKeyDuration, &durationUs));
+    EXPECT_NEAR(mFacts.durationUs, durationUs, 1);
+    const char* location = nullptr;
+    EXPECT_EQ(mFacts.location != "-", file->findCString(kKeyLocation, &location));
+    if (location != nullptr) EXPECT_EQ(mFacts.location, location);
+
+    ASSERT_EQ(mFacts.streams.size(), mExtractor->countTracks());
+    for (size_t i = 0; i < mFacts.streams.size(); ++i) {
+        SCOPED_TRACE(i);
+        const Stream& st = mFacts.streams[i];
+        sp<MetaData> meta = mExtractor->getTrackMetaData(i);
+        ASSERT_TRUE(meta->findCString(kKeyMIMEType, &mime));
+        EXPECT_EQ(MimeOf(st.codec), mime);
+        ASSERT_TRUE(meta->findInt64(kKeyDuration, &durationUs));
+        EXPECT_NEAR(st.durationUs, durationUs, 1);
+        EXPECT_EQ(int32_t(i + 1), IntOf(meta, kKeyTrackID));
+        EXPECT_GT(IntOf(meta, kKeyBitRate), 0);
+        uint32_t maxSize = 0;
+        for (const Packet& p : st.packets) maxSize = std::max(maxSize, p.size);
+        EXPECT_GE(IntOf(meta, kKeyMaxInputSize), int32_t(maxSize));
+        const char* language = nullptr;
+        EXPECT_TRUE(meta->findCString(kKeyMediaLanguage, &language));
+        uint32_t type = 0;
+        const void* data = nullptr;
+        size_t size = 0;
+        if (st.width > 0) {
+            EXPECT_EQ(st.width, IntOf(meta, kKeyWidth));
+            EXPECT_EQ(st.height, IntOf(meta, kKeyHeight));
+            int32_t rotation = 0;
+            meta->findInt32(kKeyRotation, &rotation);
+            EXPECT_EQ((360 - st.rotationCcw) % 360, rotation);
+            const uint32_t key = st.codec == "hevc" ? kKeyHVCC : kKeyAVCC;
+            ASSERT_TRUE(meta->findData(key, &type, &data, &size));
+            EXPECT_EQ(st.codec == "hevc" ? uint32_t(kTypeHVCC) : uint32_t(kTypeAVCC), type);
+            EXPECT_EQ(1, static_cast<const uint8_t*>(data)[0]);
+        } else {
+            EXPECT_EQ(st.rate, IntOf(meta, kKeySampleRate));
+            EXPECT_EQ(st.channels, IntOf(meta, kKeyChannelCount));
+            if (st.codec == "aac") {
+                ASSERT_TRUE(meta->findData(kKeyESDS, &type, &data, &size));
+                EXPECT_EQ(uint32_t(kTypeESDS), type);
+                EXPECT_EQ(0x03, static_cast<const uint8_t*>(data)[0]);
+            }
+        }
+    }
+}
+
+TEST_P(MPEG4FileTest, EverySampleMatchesTheProbe) {
+    for (size_t i = 0; i < mFacts.streams.size(); ++i) {
+        SCOPED_TRACE(i);
+        const Stream& st = mFacts.streams[i];
+        sp<IMediaSource> source = mExtractor->getTrack(i);
+        ASSERT_EQ(OK, source->start());
+        std::vector<Read> samples;
+        EXPECT_EQ(ERROR_END_OF_STREAM, ReadAll(source, &samples));
+        ASSERT_EQ(st.packets.size(), samples.size());
+        for (size_t k = 0; k < samples.size(); ++k) {
+            SCOPED_TRACE(k);
+            const Packet& p = st.packets[k];
+            EXPECT_EQ(p.size, samples[k].bytes.size());
+            EXPECT_NEAR(p.pts, samples[k].timeUs, 1);
+            EXPECT_NEAR(p.dts, samples[k].decodingUs, 1);
+            EXPECT_EQ(p.key, samples[k].sync);
+            if (st.width > 0) ExpectAnnexB(samples[k].bytes);
+        }
+        EXPECT_EQ(OK, source->stop());
+    }
+}
+
+// Expected landing sample of a seek, worked out from the probe's key frames.
+size_t ExpectedSeek(const std::vector<Packet>& packets, int64_t t, SeekMode mode) {
+    std::vector<size_t> keys;
+    for (size_t i = 0; i < packets.size(); ++i) {
+        if (packets[i].key) keys.push_back(i);
+    }
+    size_t before = keys.front(), after = SIZE_MAX;
+    for (size_t k : keys) {
+        if (packets[k].pts <= t) before = k;
+        if (packets[k].pts >= t && after == SIZE_MAX) after = k;
+    }
+    switch (mode) {
+        case MediaTrack::ReadOptions::SEEK_NEXT_SYNC:
+            return after;
+        case MediaTrack::ReadOptions::SEEK_CLOSEST_SYNC:
+            if (after == SIZE_MAX || packets[before].pts > t) return before;
+            return packets[after].pts - t < t - packets[before].pts ? after : before;
+        default:
+            return before;
+    }
+}
+
+TEST_P(MPEG4FileTest, SeekModesLandOnTheRightSyncSample) {
+    for (size_t i = 0; i < mFacts.streams.size(); ++i) {
+        const std::vector<Packet>& packets = mFacts.streams[i].packets;
+        sp<IMediaSource> source = mExtractor->getTrack(i);
+        ASSERT_EQ(OK, source->start());
+        std::vector<int64_t> targets = {0, packets.back().pts + 1000000};
+        for (const Packet& p : packets) {
+            if (!p.key) continue;
+            targets.push_back(p.pts);
+            targets.push_back(p.pts - 1);
+            targets.push_back(p.pts + 30000);
+            targets.push_back(p.pts + 600000);
+        }
+        for (int64_t t : targets) {
+            if (t < 0) continue;
+            for (SeekMode mode : {MediaTrack::ReadOptions::SEEK_PREVIOUS_SYNC, MediaTrack::ReadOptions::SEEK_NEXT_SYNC,
+                                  MediaTrack::ReadOptions::SEEK_CLOSEST_SYNC, MediaTrack::ReadOptions::SEEK_CLOSEST}) {
+                SCOPED_TRACE(testing::Message() << "track " << i << " time " << t << " mode " << int(mode));
+                MediaTrack::ReadOptions options;
+                options.setSeekTo(t, mode);
+                Read r;
+                const size_t want = ExpectedSeek(packets, t, mode);
+                if (want == SIZE_MAX) {
+                    EXPECT_EQ(ERROR_END_OF_STREAM, ReadOne(source, &r, &options));
+                    continue;
+                }
+                ASSERT_EQ(OK, ReadOne(source, &r, &options));
+                EXPECT_NEAR(packets[want].pts, r.timeUs, 1);
+                EXPECT_TRUE(r.sync);
+                EXPECT_EQ(mode == MediaTrack::ReadOptions::SEEK_CLOSEST ? t : -1, r.targetUs);
+                // Reading goes on from there in file order.
+                if (want + 1 == packets.size()) {
+                    EXPECT_EQ(ERROR_END_OF_STREAM, ReadOne(source, &r));
+                } else {
+                    ASSERT_EQ(OK, ReadOne(source, &r));
+                    EXPECT_NEAR(packets[want + 1].pts, r.timeUs, 1);
+                }
+            }
+        }
+    }
+}
+
+INSTANTIATE_TEST_SUITE_P(Files, MPEG4FileTest,
+                         ::testing::Values("avc_aac.mp4", "avc_aac_faststart.mp4", "hevc.mp4", "aac.m4a",
+                                           "avc_rotated.mp4", "amr_nb.3gp"),
+                         [](const ::testing::TestParamInfo<const char*>& info) {
+                             std::string name = info.param;
+                             for (char& c : name) {
+                                 if (!isalnum(static_cast<unsigned char>(c))) c = '_';
+                             }
+                             return name;
+                         });
+
+}  // namespace

@@ -39,7 +39,7 @@ MPEG4Extractor::MPEG4Extractor(const sp<DataSource>& source) : mDataSource(sourc
 
 status_t MPEG4Extractor::readFile() {
     if (mDataSource->getSize(&mFileSize) != OK || mFileSize <= 0) {
-        ALOGE("the file size is unknown");
+        ALOGE("the source is empty or has no known size");
         return ERROR_UNSUPPORTED;
     }
     bool haveMovie = false;

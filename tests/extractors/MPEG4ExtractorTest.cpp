@@ -15,8 +15,7 @@
 #include <media/stagefright/MediaErrors.h>
 #include <media/stagefright/MediaExtractorFactory.h>
 
-#include "MPEG4TestFile.h"
-#include "extractor/Sniffers.h"
+#include "MPEG4TestRead.h"
 
 using namespace android;
 using namespace mp4test;
@@ -42,7 +41,6 @@ struct Facts {
     std::vector<Stream> streams;
 };
 
-std::string MediaPath(const std::string& name) { return std::string(ME_TEST_MEDIA_DIR) + "/mp4/" + name; }
 
 Facts LoadFacts(const std::string& name) {
     Facts f;
@@ -72,47 +70,6 @@ Facts LoadFacts(const std::string& name) {
     return f;
 }
 
-std::string ReadFile(const std::string& path) {
-    std::ifstream in(path, std::ios::binary);
-    return std::string(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
-}
-
-sp<IMediaExtractor> OpenBytes(const std::string& bytes) {
-    return CreateMPEG4Extractor(new BufferDataSource(bytes.data(), bytes.size()));
-}
-
-struct Read {
-    int64_t timeUs = 0, decodingUs = 0, targetUs = -1;
-    bool sync = false;
-    std::string bytes;
-};
-
-// One read; the buffer is given back before returning.
-status_t ReadOne(const sp<IMediaSource>& source, Read* out, const MediaTrack::ReadOptions* options = nullptr) {
-    MediaBufferBase* buffer = nullptr;
-    const status_t err = source->read(&buffer, options);
-    if (err != OK) {
-        EXPECT_EQ(nullptr, buffer);
-        return err;
-    }
-    MetaDataBase& meta = buffer->meta_data();
-    int32_t sync = 0;
-    EXPECT_TRUE(meta.findInt64(kKeyTime, &out->timeUs));
-    EXPECT_TRUE(meta.findInt64(kKeyDecodingTime, &out->decodingUs));
-    EXPECT_TRUE(meta.findInt32(kKeyIsSyncFrame, &sync));
-    if (!meta.findInt64(kKeyTargetTime, &out->targetUs)) out->targetUs = -1;
-    out->sync = sync != 0;
-    out->bytes.assign(static_cast<const char*>(buffer->data()) + buffer->range_offset(), buffer->range_length());
-    buffer->release();
-    return OK;
-}
-
-// Every sample until the first failure, whose status is returned.
-status_t ReadAll(const sp<IMediaSource>& source, std::vector<Read>* out, size_t limit = SIZE_MAX) {
-    status_t err = OK;
-    for (Read r; out->size() < limit && (err = ReadOne(source, &r)) == OK;) out->push_back(r);
-    return err;
-}
 
 std::string MimeOf(const std::string& codec) {
     static const std::map<std::string, std::string> kMimes = {

@@ -15,6 +15,9 @@ enum : uint32_t {
     kKeyDeviceBookmarkSize = 'bkSz',   // int64, audio track metadata
     kKeyDeviceBitsPerSample = 'bPsp',  // int32, bits per PCM sample
     kKeyFlacStreamInfoRaw = 'FRAW',    // data: STREAMINFO block with its header
+    kKeyDeviceVideoRecordType = 'vrty',  // cstring
+    kKeyDeviceSphereView = 'svdt',       // data
+    kKeyDeviceWaveForm2 = 'waf2',        // data: big-endian 16-bit values
 };
 
 }  // namespace android

@@ -176,7 +176,7 @@ bool annexBToHvcc(const uint8_t* data, size_t size, Bytes* hvcc) {
     return true;
 }
 
-bool esdsDecoderSpecificInfo(const uint8_t* data, size_t size, const uint8_t** dsi, size_t* dsiSize) {
+bool esdsDecoderConfig(const uint8_t* data, size_t size, EsdsConfig* out) {
     ByteReader r(data, size);
     // The esds box payload begins with version and flags; the descriptor
     // itself begins with its tag.
@@ -193,10 +193,26 @@ bool esdsDecoderSpecificInfo(const uint8_t* data, size_t size, const uint8_t** d
     }
     if ((flags & 0x20) && !es.skip(2)) return false;  // OCR_ES_Id
     ByteReader config(nullptr, 0), info(nullptr, 0);
-    if (!findDescriptor(&es, 0x04, &config) || !config.skip(13)) return false;
-    if (!findDescriptor(&config, 0x05, &info)) return false;
-    *dsi = info.current();
-    *dsiSize = info.size();
+    uint8_t streamType;
+    uint32_t bufferSize;
+    EsdsConfig c;
+    if (!findDescriptor(&es, 0x04, &config) || !config.u8(&c.objectTypeIndication) || !config.u8(&streamType) ||
+        !config.be24(&bufferSize) || !config.be32(&c.maxBitrate) || !config.be32(&c.avgBitrate)) {
+        return false;
+    }
+    if (findDescriptor(&config, 0x05, &info)) {
+        c.dsi = info.current();
+        c.dsiSize = info.size();
+    }
+    *out = c;
+    return true;
+}
+
+bool esdsDecoderSpecificInfo(const uint8_t* data, size_t size, const uint8_t** dsi, size_t* dsiSize) {
+    EsdsConfig config;
+    if (!esdsDecoderConfig(data, size, &config) || config.dsi == nullptr) return false;
+    *dsi = config.dsi;
+    *dsiSize = config.dsiSize;
     return true;
 }
 

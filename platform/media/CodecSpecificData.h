@@ -34,6 +34,16 @@ bool annexBToHvcc(const uint8_t* data, size_t size, Bytes* hvcc);
 // The blob starts at the descriptor's tag 0x03; a leading 4-byte version and
 // flags field of the esds box is tolerated. *dsi points into the blob.
 bool esdsDecoderSpecificInfo(const uint8_t* data, size_t size, const uint8_t** dsi, size_t* dsiSize);
+// The DecoderConfigDescriptor (7.2.6.6) of the same blob: object type,
+// bitrates, and the DecoderSpecificInfo (null when the descriptor has none).
+struct EsdsConfig {
+    uint8_t objectTypeIndication = 0;
+    uint32_t maxBitrate = 0;
+    uint32_t avgBitrate = 0;
+    const uint8_t* dsi = nullptr;
+    size_t dsiSize = 0;
+};
+bool esdsDecoderConfig(const uint8_t* data, size_t size, EsdsConfig* config);
 // A minimal ES_Descriptor around the DecoderSpecificInfo.
 Bytes makeEsds(uint8_t objectTypeIndication, uint8_t streamType, uint32_t maxBitrate, uint32_t avgBitrate,
                const uint8_t* dsi, size_t dsiSize);

@@ -9,7 +9,6 @@
 
 #include "extractor/Sniffers.h"
 #include "mpeg4/MPEG4Box.h"
-#include "mpeg4/MPEG4EditorKeys.h"
 #include "mpeg4/MPEG4Source.h"
 #include "mpeg4/MPEG4UserData.h"
 
@@ -107,17 +106,15 @@ status_t MPEG4Extractor::readMovie(const ByteReader& moov) {
         return ERROR_UNSUPPORTED;
     }
 
-    mpeg4::UserData userData;
+    DeviceItems items;
     if (mpeg4::FindChild(moov, FourCC('u', 'd', 't', 'a'), &box)) {
-        mpeg4::ParseUserData(box, mFileMeta.get(), &userData);
+        mpeg4::ParseUserData(box, mFileMeta.get(), &items);
     }
     int64_t durationUs = 0;
     for (const auto& track : mTracks) {
         int64_t trackUs;
         if (track->meta->findInt64(kKeyDuration, &trackUs)) durationUs = std::max(durationUs, trackUs);
-        if (track->isAudio && userData.hasBookmarkSize) {
-            track->meta->setInt64(mpeg4::kEditorKeyBookmarkSize, userData.bookmarkSize);
-        }
+        if (track->isAudio) items.publishTrackItems(track->meta.get());
     }
     mFileMeta->setCString(kKeyMIMEType, MEDIA_MIMETYPE_CONTAINER_MPEG4);
     mFileMeta->setInt64(kKeyDuration, durationUs);

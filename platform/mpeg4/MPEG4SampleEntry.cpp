@@ -4,9 +4,10 @@
 #include <log/log.h>
 #include <media/stagefright/MediaDefs.h>
 #include <media/stagefright/MediaErrors.h>
+#include <media/stagefright/foundation/ABitReader.h>
 
+#include "media/CodecSpecificData.h"
 #include "mpeg4/MPEG4Box.h"
-#include "mpeg4/MPEG4Esds.h"
 
 namespace android {
 namespace mpeg4 {
@@ -24,6 +25,58 @@ constexpr size_t kAudioEntryBytes = 20;
 status_t Malformed(const char* what) {
     ALOGW("malformed sample description: %s", what);
     return ERROR_MALFORMED;
+}
+
+bool ReadSampleRate(ABitReader* bits, int32_t* rate) {
+    static const int32_t kRates[] = {96000, 88200, 64000, 48000, 44100, 32000, 24000,
+                                     22050, 16000, 12000, 11025, 8000,  7350};
+    uint32_t index, explicitRate;
+    if (!bits->getBitsGraceful(4, &index)) return false;
+    if (index == 0xF) {
+        if (!bits->getBitsGraceful(24, &explicitRate)) return false;
+        *rate = static_cast<int32_t>(explicitRate);
+        return true;
+    }
+    if (index >= sizeof(kRates) / sizeof(kRates[0])) return false;
+    *rate = kRates[index];
+    return true;
+}
+
+// AudioSpecificConfig (ISO/IEC 14496-3, 1.6.2.1): object type, sample rate
+// and channel configuration; channels is 0 when a program config element
+// carries them instead.
+bool ParseAudioSpecificConfig(const uint8_t* data, size_t size, int32_t* objectType, int32_t* sampleRate,
+                              int32_t* channels) {
+    ABitReader bits(data, size);
+    uint32_t aot, channelConfig;
+    if (!bits.getBitsGraceful(5, &aot)) return false;
+    if (aot == 31) {
+        uint32_t extension;
+        if (!bits.getBitsGraceful(6, &extension)) return false;
+        aot = 32 + extension;
+    }
+    if (!ReadSampleRate(&bits, sampleRate) || !bits.getBitsGraceful(4, &channelConfig)) return false;
+    // Explicit SBR/PS signalling: the output runs at the extension rate.
+    if (aot == 5 || aot == 29) {
+        int32_t extensionRate;
+        if (ReadSampleRate(&bits, &extensionRate)) *sampleRate = extensionRate;
+    }
+    static const int32_t kChannels[] = {0, 1, 2, 3, 4, 5, 6, 8};
+    *objectType = static_cast<int32_t>(aot);
+    *channels = channelConfig < 8 ? kChannels[channelConfig] : 0;
+    return true;
+}
+
+// The ES_Descriptor of an 'esds' payload, after its version and flags.
+bool ReadEsds(ByteReader esds, ByteReader* descriptor, EsdsConfig* config) {
+    uint8_t version;
+    uint32_t flags;
+    if (!ReadFullBoxHeader(&esds, &version, &flags) ||
+        !esdsDecoderConfig(esds.current(), esds.remaining(), config)) {
+        return false;
+    }
+    *descriptor = esds;
+    return true;
 }
 
 void ReadBitrateBox(const ByteReader& children, CodecInfo* info) {
@@ -65,16 +118,13 @@ status_t ParseVisual(uint32_t format, ByteReader r, MetaData* meta, CodecInfo* i
             meta->setCString(kKeyMIMEType, MEDIA_MIMETYPE_VIDEO_HEVC);
             return ReadNalConfig(r, FourCC('h', 'v', 'c', 'C'), kKeyHVCC, kTypeHVCC, 23, 21, meta, info);
         case FourCC('m', 'p', '4', 'v'): {
-            ByteReader esds(nullptr, 0);
-            uint8_t version;
-            uint32_t flags;
-            EsdsInfo es;
-            if (!FindChild(r, FourCC('e', 's', 'd', 's'), &esds) || !ReadFullBoxHeader(&esds, &version, &flags) ||
-                !ParseEsds(esds, &es)) {
+            ByteReader esds(nullptr, 0), descriptor(nullptr, 0);
+            EsdsConfig es;
+            if (!FindChild(r, FourCC('e', 's', 'd', 's'), &esds) || !ReadEsds(esds, &descriptor, &es)) {
                 return Malformed("mp4v without a usable esds");
             }
             meta->setCString(kKeyMIMEType, MEDIA_MIMETYPE_VIDEO_MPEG4);
-            meta->setData(kKeyESDS, kTypeESDS, esds.current(), esds.remaining());
+            meta->setData(kKeyESDS, kTypeESDS, descriptor.current(), descriptor.remaining());
             if (es.avgBitrate > 0) info->avgBitrate = es.avgBitrate;
             return OK;
         }
@@ -94,18 +144,17 @@ status_t ParseAac(const ByteReader& children, MetaData* meta, CodecInfo* info) {
           FindChild(wave, FourCC('e', 's', 'd', 's'), &esds))) {
         return Malformed("mp4a without esds");
     }
-    uint8_t version;
-    uint32_t flags;
-    EsdsInfo es;
-    if (!ReadFullBoxHeader(&esds, &version, &flags) || !ParseEsds(esds, &es)) return Malformed("bad esds");
+    ByteReader descriptor(nullptr, 0);
+    EsdsConfig es;
+    if (!ReadEsds(esds, &descriptor, &es)) return Malformed("bad esds");
     if (es.avgBitrate > 0) info->avgBitrate = es.avgBitrate;
-    switch (es.objectType) {
+    switch (es.objectTypeIndication) {
         case 0x40:  // MPEG-4 audio
         case 0x66:  // MPEG-2 AAC main, LC and SSR
         case 0x67:
         case 0x68: {
             int32_t aot, rate, channels;
-            if (!ParseAudioSpecificConfig(es.specificInfo, es.specificInfoSize, &aot, &rate, &channels)) {
+            if (!ParseAudioSpecificConfig(es.dsi, es.dsiSize, &aot, &rate, &channels)) {
                 return Malformed("bad AudioSpecificConfig");
             }
             meta->setCString(kKeyMIMEType, MEDIA_MIMETYPE_AUDIO_AAC);
@@ -119,10 +168,10 @@ status_t ParseAac(const ByteReader& children, MetaData* meta, CodecInfo* info) {
             meta->setCString(kKeyMIMEType, MEDIA_MIMETYPE_AUDIO_MPEG);
             break;
         default:
-            ALOGW("audio object type 0x%02x not supported", es.objectType);
+            ALOGW("audio object type 0x%02x not supported", es.objectTypeIndication);
             return ERROR_UNSUPPORTED;
     }
-    meta->setData(kKeyESDS, kTypeESDS, esds.current(), esds.remaining());
+    meta->setData(kKeyESDS, kTypeESDS, descriptor.current(), descriptor.remaining());
     return OK;
 }
 

@@ -2,39 +2,27 @@
 #include "mpeg4/MPEG4Source.h"
 
 #include <log/log.h>
-#include <media/stagefright/MediaBuffer.h>
 #include <media/stagefright/MediaErrors.h>
 
-#include "mpeg4/MPEG4EditorKeys.h"
 #include "mpeg4/NalLengthConverter.h"
 
 namespace android {
 
 using mpeg4::SampleInfo;
-typedef MediaTrack::ReadOptions::SeekMode SeekMode;
 
 MPEG4Source::MPEG4Source(const sp<DataSource>& source, const std::shared_ptr<const mpeg4::Track>& track,
                          off64_t fileSize)
-    : mDataSource(source), mTrack(track), mFileSize(fileSize), mCursor(track->table) {
-    mCursor.seek(0);
-}
+    : TrackSource(track->meta), mDataSource(source), mTrack(track), mFileSize(fileSize), mCursor(track->table) {}
 
-status_t MPEG4Source::start(MetaData*) {
-    std::lock_guard<std::mutex> lock(mLock);
+status_t MPEG4Source::onStart() {
     mCursor.seek(0);
     mTargetTimeUs = -1;
     return OK;
 }
 
-status_t MPEG4Source::stop() {
-    std::lock_guard<std::mutex> lock(mLock);
-    std::vector<uint8_t>().swap(mScratch);
-    return OK;
-}
+void MPEG4Source::onStop() { std::vector<uint8_t>().swap(mScratch); }
 
-sp<MetaData> MPEG4Source::getFormat() { return mTrack->meta; }
-
-int64_t MPEG4Source::syncTimeUs(uint32_t k) {
+int64_t MPEG4Source::syncTimeUs(uint32_t k) const {
     mpeg4::SampleCursor probe(mTrack->table);
     probe.seek(mTrack->table.syncSample(k));
     return mTrack->presentationUs(probe.info());
@@ -42,57 +30,47 @@ int64_t MPEG4Source::syncTimeUs(uint32_t k) {
 
 // Sync samples are taken to be presented in decoding order, which holds for
 // the closed groups of pictures that encoders write.
-void MPEG4Source::seekLocked(int64_t timeUs, SeekMode mode) {
+status_t MPEG4Source::seekTo(int64_t timeUs, SeekMode mode) {
     const uint32_t syncs = mTrack->table.syncCount();
-    mTargetTimeUs = -1;
-    if (syncs == 0) {
-        mCursor.seek(0);
-        return;
-    }
-    // First sync sample presented after `timeUs`.
-    uint32_t lo = 0, hi = syncs;
-    while (lo < hi) {
-        const uint32_t mid = lo + (hi - lo) / 2;
+    mTargetTimeUs = mode == MediaTrack::ReadOptions::SEEK_CLOSEST ? timeUs : -1;
+    // The first sync sample presented after the time.
+    uint32_t after = 0, hi = syncs;
+    while (after < hi) {
+        const uint32_t mid = after + (hi - after) / 2;
         if (syncTimeUs(mid) <= timeUs) {
-            lo = mid + 1;
+            after = mid + 1;
         } else {
             hi = mid;
         }
     }
-    const uint32_t after = lo;
-    uint32_t chosen = after > 0 ? after - 1 : 0;
-    if (mode == MediaTrack::ReadOptions::SEEK_NEXT_SYNC) {
-        chosen = (after > 0 && syncTimeUs(after - 1) == timeUs) ? after - 1 : after;
-        if (chosen >= syncs) {
+    uint32_t chosen = 0;
+    if (after == syncs && syncs > 0) {
+        chosen = syncs - 1;
+        if (mode == MediaTrack::ReadOptions::SEEK_NEXT_SYNC && syncTimeUs(chosen) < timeUs) {
             mCursor.seek(mTrack->table.count());  // nothing at or after the time
-            return;
+            return OK;
         }
-    } else if (mode == MediaTrack::ReadOptions::SEEK_CLOSEST_SYNC && after > 0 && after < syncs) {
-        if (syncTimeUs(after) - timeUs < timeUs - syncTimeUs(after - 1)) chosen = after;
-    } else if (mode == MediaTrack::ReadOptions::SEEK_CLOSEST) {
-        mTargetTimeUs = timeUs;
+    } else if (after > 0) {
+        const SeekMode rule = mode == MediaTrack::ReadOptions::SEEK_CLOSEST ? MediaTrack::ReadOptions::SEEK_PREVIOUS_SYNC
+                                                                            : mode;
+        chosen = SeekPrefersLater(timeUs, syncTimeUs(after - 1), syncTimeUs(after), rule) ? after : after - 1;
     }
-    mCursor.seek(mTrack->table.syncSample(chosen));
+    // A track without sync samples starts over from its first sample.
+    mCursor.seek(syncs > 0 ? mTrack->table.syncSample(chosen) : 0);
+    return OK;
 }
 
-status_t MPEG4Source::read(MediaBufferBase** buffer, const MediaTrack::ReadOptions* options) {
-    std::lock_guard<std::mutex> lock(mLock);
-    *buffer = nullptr;
-    int64_t seekTimeUs;
-    SeekMode mode;
-    if (options != nullptr && options->getSeekTo(&seekTimeUs, &mode)) seekLocked(seekTimeUs, mode);
+status_t MPEG4Source::readNext(MediaBufferBase** buffer) {
     if (!mCursor.valid()) return ERROR_END_OF_STREAM;
-
     // The sample is used up whatever happens, so a bad one is skipped by the
     // next read.
     const SampleInfo sample = mCursor.info();
     mCursor.advance();
-    MediaBufferBase* out = nullptr;
-    const status_t err = readSampleLocked(sample, &out);
+    MediaBuffer* out = nullptr;
+    const status_t err = readSample(sample, mTrack->presentationUs(sample), &out);
     if (err != OK) return err;
 
     MetaDataBase& meta = out->meta_data();
-    meta.setInt64(kKeyTime, mTrack->presentationUs(sample));
     meta.setInt64(kKeyDecodingTime, mTrack->decodingUs(sample));
     meta.setInt32(kKeyIsSyncFrame, sample.sync ? 1 : 0);
     if (mTargetTimeUs >= 0) {
@@ -103,22 +81,20 @@ status_t MPEG4Source::read(MediaBufferBase** buffer, const MediaTrack::ReadOptio
     return OK;
 }
 
-status_t MPEG4Source::readSampleLocked(const SampleInfo& sample, MediaBufferBase** buffer) {
+status_t MPEG4Source::readSample(const SampleInfo& sample, int64_t timeUs, MediaBuffer** buffer) {
     if (sample.offset > uint64_t(mFileSize) || sample.size > uint64_t(mFileSize) - sample.offset) {
         ALOGW("sample at %llu (%u bytes) lies past the end of the file", (unsigned long long)sample.offset,
               sample.size);
         return ERROR_MALFORMED;
     }
+    // A 4-byte prefix turns into a start code in place; shorter ones grow
+    // the sample, which is then rebuilt from a scratch copy.
     const size_t lengthSize = mTrack->nalLengthSize;
     const bool inPlace = lengthSize == 0 || lengthSize == 4;
-    uint8_t* raw;
     MediaBuffer* out = nullptr;
+    uint8_t* raw;
     if (inPlace) {
-        out = new MediaBuffer(sample.size);
-        if (sample.size > 0 && out->data() == nullptr) {
-            out->release();
-            return NO_MEMORY;
-        }
+        if ((out = NewSampleBuffer(sample.size, timeUs)) == nullptr) return NO_MEMORY;
         raw = static_cast<uint8_t*>(out->data());
     } else {
         mScratch.resize(sample.size);
@@ -130,24 +106,16 @@ status_t MPEG4Source::readSampleLocked(const SampleInfo& sample, MediaBufferBase
         if (out != nullptr) out->release();
         return n < 0 ? static_cast<status_t>(n) : ERROR_IO;
     }
-    if (lengthSize == 0) {
-        *buffer = out;
-        return OK;
-    }
-    size_t annexBSize;
-    if (!mpeg4::AnnexBSize(raw, sample.size, lengthSize, &annexBSize)) {
-        ALOGW("NAL unit length overruns a %u-byte sample", sample.size);
-        if (out != nullptr) out->release();
-        return mpeg4::kEditorErrorCorruptNal;
-    }
-    if (!inPlace) {
-        out = new MediaBuffer(annexBSize);
-        if (annexBSize > 0 && out->data() == nullptr) {
-            out->release();
-            return NO_MEMORY;
+    if (lengthSize > 0) {
+        size_t annexBSize;
+        if (!mpeg4::AnnexBSize(raw, sample.size, lengthSize, &annexBSize)) {
+            ALOGW("NAL unit length overruns a %u-byte sample", sample.size);
+            if (out != nullptr) out->release();
+            return kErrorCorruptNal;
         }
+        if (!inPlace && (out = NewSampleBuffer(annexBSize, timeUs)) == nullptr) return NO_MEMORY;
+        mpeg4::ToAnnexB(raw, sample.size, lengthSize, static_cast<uint8_t*>(out->data()));
     }
-    mpeg4::ToAnnexB(raw, sample.size, lengthSize, static_cast<uint8_t*>(out->data()));
     *buffer = out;
     return OK;
 }

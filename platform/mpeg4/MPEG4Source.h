@@ -2,12 +2,11 @@
 #define MPEG4_SOURCE_H_
 
 #include <memory>
-#include <mutex>
 #include <vector>
 
 #include <media/stagefright/DataSource.h>
-#include <media/stagefright/MediaSource.h>
 
+#include "extractor/TrackSource.h"
 #include "mpeg4/MPEG4Track.h"
 
 namespace android {
@@ -15,26 +14,28 @@ namespace android {
 // The samples of one MP4 track, read from the file one at a time: memory
 // per read is the sample's size (twice that when NAL prefixes shorter than a
 // start code make the sample grow).
-class MPEG4Source : public MediaSource {
+class MPEG4Source : public TrackSource {
 public:
-    MPEG4Source(const sp<DataSource>& source, const std::shared_ptr<const mpeg4::Track>& track, off64_t fileSize);
+    // The media editor's status for a sample with a broken NAL unit; it skips
+    // to the next sample. The editor exports the same value.
+    static constexpr status_t kErrorCorruptNal = -1099;
 
-    status_t start(MetaData* params = nullptr) override;
-    status_t stop() override;
-    sp<MetaData> getFormat() override;
-    // Seeks honour the four sync modes; SEEK_CLOSEST starts at the sync
-    // sample before the time and marks the first buffer with kKeyTargetTime.
-    status_t read(MediaBufferBase** buffer, const MediaTrack::ReadOptions* options = nullptr) override;
+    MPEG4Source(const sp<DataSource>& source, const std::shared_ptr<const mpeg4::Track>& track, off64_t fileSize);
 
 protected:
     ~MPEG4Source() override = default;
 
-private:
-    void seekLocked(int64_t timeUs, MediaTrack::ReadOptions::SeekMode mode);
-    int64_t syncTimeUs(uint32_t k);
-    status_t readSampleLocked(const mpeg4::SampleInfo& sample, MediaBufferBase** buffer);
+    status_t onStart() override;
+    void onStop() override;
+    // SEEK_CLOSEST starts at the sync sample before the time and marks the
+    // first buffer with kKeyTargetTime.
+    status_t seekTo(int64_t timeUs, SeekMode mode) override;
+    status_t readNext(MediaBufferBase** buffer) override;
 
-    std::mutex mLock;
+private:
+    int64_t syncTimeUs(uint32_t k) const;
+    status_t readSample(const mpeg4::SampleInfo& sample, int64_t timeUs, MediaBuffer** buffer);
+
     const sp<DataSource> mDataSource;
     const std::shared_ptr<const mpeg4::Track> mTrack;
     const off64_t mFileSize;

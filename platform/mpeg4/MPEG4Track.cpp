@@ -170,7 +170,7 @@ int32_t ClampToInt32(uint64_t v) { return v > INT32_MAX ? INT32_MAX : static_cas
 
 }  // namespace
 
-int64_t TicksToUs(int64_t ticks, uint32_t timescale) {
+int64_t SignedTicksToUs(int64_t ticks, uint32_t timescale) {
     if (timescale == 0) return 0;
     __int128 scaled = static_cast<__int128>(ticks) * 1000000;
     scaled += ticks < 0 ? -static_cast<__int128>(timescale / 2) : static_cast<__int128>(timescale / 2);
@@ -220,16 +220,16 @@ status_t ParseTrack(const ByteReader& trak, uint32_t movieTimescale, Track* trac
     if (FindChild(trak, FourCC('e', 'd', 't', 's'), &edts) && FindChild(edts, FourCC('e', 'l', 's', 't'), &box)) {
         if ((err = ReadEditList(box, &edits)) != OK) return err;
         track->mediaStartTicks = edits.mediaStartTicks;
-        track->emptyEditUs = TicksToUs(static_cast<int64_t>(edits.emptyTicks), movieTimescale);
+        track->emptyEditUs = SignedTicksToUs(static_cast<int64_t>(edits.emptyTicks), movieTimescale);
     }
 
     int64_t durationUs;
     if (edits.totalTicks > 0 && movieTimescale > 0) {
-        durationUs = TicksToUs(static_cast<int64_t>(edits.totalTicks), movieTimescale);
+        durationUs = SignedTicksToUs(static_cast<int64_t>(edits.totalTicks), movieTimescale);
     } else if (mdhd.duration > 0 && mdhd.duration <= uint64_t(kMaxTime)) {
-        durationUs = TicksToUs(static_cast<int64_t>(mdhd.duration), mdhd.timescale);
+        durationUs = SignedTicksToUs(static_cast<int64_t>(mdhd.duration), mdhd.timescale);
     } else {
-        durationUs = TicksToUs(table.endDts(), mdhd.timescale);
+        durationUs = SignedTicksToUs(table.endDts(), mdhd.timescale);
     }
     meta->setInt32(kKeyTrackID, static_cast<int32_t>(tkhd.trackId));
     meta->setInt64(kKeyDuration, durationUs);
@@ -241,7 +241,7 @@ status_t ParseTrack(const ByteReader& trak, uint32_t movieTimescale, Track* trac
     if (codec.nalLengthSize > 0) maxInput = (maxInput * 4 + codec.nalLengthSize - 1) / codec.nalLengthSize;
     meta->setInt32(kKeyMaxInputSize, ClampToInt32(maxInput));
 
-    const int64_t mediaUs = TicksToUs(table.endDts(), mdhd.timescale);
+    const int64_t mediaUs = SignedTicksToUs(table.endDts(), mdhd.timescale);
     if (codec.avgBitrate > 0) {
         meta->setInt32(kKeyBitRate, ClampToInt32(codec.avgBitrate));
     } else if (mediaUs > 0) {

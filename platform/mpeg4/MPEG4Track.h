@@ -14,7 +14,7 @@ namespace mpeg4 {
 
 // Ticks of `timescale` in microseconds, rounded to nearest and kept in a range
 // where sums of a few such times cannot overflow.
-int64_t TicksToUs(int64_t ticks, uint32_t timescale);
+int64_t SignedTicksToUs(int64_t ticks, uint32_t timescale);
 
 // One track of the movie, read-only once parsed; its sources share it.
 struct Track {
@@ -29,10 +29,10 @@ struct Track {
     bool isAudio = false;
 
     int64_t presentationUs(const SampleInfo& s) const {
-        return TicksToUs(s.dts + s.ctsOffset - mediaStartTicks, timescale) + emptyEditUs;
+        return SignedTicksToUs(s.dts + s.ctsOffset - mediaStartTicks, timescale) + emptyEditUs;
     }
     int64_t decodingUs(const SampleInfo& s) const {
-        return TicksToUs(s.dts - mediaStartTicks, timescale) + emptyEditUs;
+        return SignedTicksToUs(s.dts - mediaStartTicks, timescale) + emptyEditUs;
     }
 };
 

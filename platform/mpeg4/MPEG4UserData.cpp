@@ -9,7 +9,7 @@
 #include <log/log.h>
 
 #include "mpeg4/MPEG4Box.h"
-#include "mpeg4/MPEG4EditorKeys.h"
+#include "extractor/DeviceKeys.h"
 
 namespace android {
 namespace mpeg4 {
@@ -65,12 +65,17 @@ bool ReadLoci(ByteReader r, std::string* location) {
 
 }  // namespace
 
-void ParseUserData(const ByteReader& udta, MetaData* meta, UserData* out) {
+void ParseUserData(const ByteReader& udta, MetaData* meta, DeviceItems* items) {
     std::string xyz, loci;
     BoxIterator it(udta);
     while (it.next()) {
+        const uint32_t type = it.header().type;
         const ByteReader& payload = it.payload();
-        switch (it.header().type) {
+        if (DeviceItems::IsItem(type)) {
+            items->take(type, payload.current(), payload.remaining(), true);
+            continue;
+        }
+        switch (type) {
             case FourCC('\xA9', 'x', 'y', 'z'):
                 if (!ReadXyz(payload, &xyz)) ALOGW("unreadable location");
                 break;
@@ -78,35 +83,16 @@ void ParseUserData(const ByteReader& udta, MetaData* meta, UserData* out) {
                 if (!ReadLoci(payload, &loci)) ALOGW("unreadable 3GPP location");
                 break;
             case FourCC('q', 'n', 'r', 't'):
-                meta->setCString(kEditorKeyVideoRecordType, TextOf(payload).c_str());
-                break;
-            case FourCC('u', 'm', 's', 'g'):
-                meta->setCString(kEditorKeyUserMessage, TextOf(payload).c_str());
-                break;
-            case FourCC('r', 'm', 'o', 'd'):
-                meta->setCString(kEditorKeyRecMode, TextOf(payload).c_str());
-                break;
-            case FourCC('w', 'a', 'f', 'm'):
-                meta->setData(kEditorKeyWaveForm, kEditorKeyWaveForm, payload.current(), payload.remaining());
+                meta->setCString(kKeyDeviceVideoRecordType, TextOf(payload).c_str());
                 break;
             case FourCC('w', 'a', 'f', '2'):
-                meta->setData(kEditorKeyWaveForm2, kEditorKeyWaveForm2, payload.current(), payload.remaining());
+                meta->setData(kKeyDeviceWaveForm2, 0, payload.current(), payload.remaining());
                 break;
-            case FourCC('b', 'k', 's', 'z'): {
-                ByteReader r = payload;
-                uint64_t size;
-                if (r.remaining() == 8 && r.be64(&size)) {
-                    out->hasBookmarkSize = true;
-                    out->bookmarkSize = static_cast<int64_t>(size);
-                } else {
-                    ALOGW("bookmark size of %zu bytes ignored", payload.remaining());
-                }
-                break;
-            }
             default:
                 break;
         }
     }
+    items->publishFileItems(meta);
     if (!xyz.empty()) {
         meta->setCString(kKeyLocation, xyz.c_str());
     } else if (!loci.empty()) {
@@ -121,7 +107,7 @@ bool IsSphereViewUuid(const uint8_t userType[16]) {
 void SetSphereView(MetaData* meta, const uint8_t* data, size_t size) {
     std::vector<uint8_t> item(data, data + size);
     item.push_back(0);
-    meta->setData(kEditorKeySphereView, kEditorKeySphereView, item.data(), item.size());
+    meta->setData(kKeyDeviceSphereView, 0, item.data(), item.size());
 }
 
 }  // namespace mpeg4

@@ -7,17 +7,14 @@
 #include <media/stagefright/MetaData.h>
 #include <media/stagefright/foundation/ByteReader.h>
 
+#include "extractor/DeviceItems.h"
+
 namespace android {
 namespace mpeg4 {
 
-// The device's items and the location in 'moov/udta'.
-struct UserData {
-    bool hasBookmarkSize = false;
-    int64_t bookmarkSize = 0;  // goes to every audio track's metadata
-};
-
-// Publishes the items of a 'udta' payload in the file metadata.
-void ParseUserData(const ByteReader& udta, MetaData* fileMeta, UserData* out);
+// Publishes the location and the device's items of a 'moov/udta' payload in
+// the file metadata; the items that travel with audio tracks stay in `items`.
+void ParseUserData(const ByteReader& udta, MetaData* fileMeta, DeviceItems* items);
 
 // Whether a top-level 'uuid' box carries the sphere view data.
 bool IsSphereViewUuid(const uint8_t userType[16]);

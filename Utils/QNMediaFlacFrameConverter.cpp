@@ -82,18 +82,72 @@ uint16_t crc16Plain(uint16_t crc, const unsigned char* data, uint32_t size) {
     return crc;
 }
 
-uint16_t crc16Fast(uint16_t crc, const unsigned char* p, uint32_t size) {
+inline uint16_t sliceStep(uint16_t crc, uint64_t w0, uint64_t w1) {
     const auto& T = kCrc16Slices.t;
-    while (size >= kSlices) {
-        const uint32_t b0 = p[0] ^ (crc >> 8);
-        const uint32_t b1 = p[1] ^ (crc & 0xFF);
-        crc = T[15][b0] ^ T[14][b1] ^ T[13][p[2]] ^ T[12][p[3]] ^ T[11][p[4]] ^ T[10][p[5]] ^
-              T[9][p[6]] ^ T[8][p[7]] ^ T[7][p[8]] ^ T[6][p[9]] ^ T[5][p[10]] ^ T[4][p[11]] ^
-              T[3][p[12]] ^ T[2][p[13]] ^ T[1][p[14]] ^ T[0][p[15]];
-        p += kSlices;
-        size -= kSlices;
+    auto b = [](uint64_t w, int k) { return static_cast<uint32_t>((w >> (8 * k)) & 0xFF); };
+    return T[15][b(w0, 0) ^ (crc >> 8)] ^ T[14][b(w0, 1) ^ (crc & 0xFF)] ^ T[13][b(w0, 2)] ^ T[12][b(w0, 3)] ^
+           T[11][b(w0, 4)] ^ T[10][b(w0, 5)] ^ T[9][b(w0, 6)] ^ T[8][b(w0, 7)] ^ T[7][b(w1, 0)] ^
+           T[6][b(w1, 1)] ^ T[5][b(w1, 2)] ^ T[4][b(w1, 3)] ^ T[3][b(w1, 4)] ^ T[2][b(w1, 5)] ^ T[1][b(w1, 6)] ^
+           T[0][b(w1, 7)];
+}
+
+static_assert(__BYTE_ORDER__ == __ORDER_LITTLE_ENDIAN__, "slice bytes are taken from little-endian words");
+
+// Sixteen bytes per step.
+uint16_t crc16Fast(uint16_t crc, const unsigned char* p, uint32_t size) {
+    for (; size >= kSlices; size -= kSlices, p += kSlices) {
+        uint64_t w[2];
+        memcpy(w, p, sizeof(w));
+        crc = sliceStep(crc, w[0], w[1]);
     }
     return crc16Plain(crc, p, size);
+}
+
+// Polynomials modulo the CRC-16 generator, for joining the sums of two runs.
+constexpr uint16_t mulMod(uint16_t a, uint16_t b) {
+    uint16_t r = 0;
+    for (int i = 15; i >= 0; --i) {
+        r = static_cast<uint16_t>((r & 0x8000) ? (r << 1) ^ 0x8005 : r << 1);
+        if ((b >> i) & 1) r ^= a;
+    }
+    return r;
+}
+struct Crc16Powers {
+    uint16_t t[32];  // x^(8 * 2^k) mod P
+};
+constexpr Crc16Powers makeCrc16Powers() {
+    Crc16Powers p{};
+    p.t[0] = 0x0100;
+    for (int k = 1; k < 32; ++k) p.t[k] = mulMod(p.t[k - 1], p.t[k - 1]);
+    return p;
+}
+constexpr Crc16Powers kCrc16Powers = makeCrc16Powers();
+
+// The sum of crc's message followed by n more zero bytes.
+uint16_t shiftCrc(uint16_t crc, uint32_t n) {
+    uint16_t power = 1;
+    for (int k = 0; n != 0; ++k, n >>= 1) {
+        if (n & 1) power = mulMod(power, kCrc16Powers.t[k]);
+    }
+    return mulMod(crc, power);
+}
+
+// Continues crc over size bytes. The two halves run as independent sums, so
+// their table look-ups overlap, joined by crc(A B) = crc(A) * x^(8|B|) + crc(B)
+// (there is no initial value or final XOR).
+uint16_t crc16TwoRuns(uint16_t crc, const unsigned char* p, uint32_t size) {
+    const uint32_t half = (size / 2) & ~(kSlices - 1);
+    if (half < 4 * kSlices) return crc16Fast(crc, p, size);
+    uint16_t a = crc, b = 0;
+    for (uint32_t i = 0; i < half; i += kSlices) {
+        uint64_t wa[2], wb[2];
+        memcpy(wa, p + i, sizeof(wa));
+        memcpy(wb, p + half + i, sizeof(wb));
+        a = sliceStep(a, wa[0], wa[1]);
+        b = sliceStep(b, wb[0], wb[1]);
+    }
+    b = crc16Fast(b, p + 2 * half, size - 2 * half);
+    return static_cast<uint16_t>(shiftCrc(a, size - half) ^ b);
 }
 
 // Continuation bytes of a coded number carry 6 bits each, under a 10xxxxxx prefix.
@@ -239,7 +293,7 @@ bool QNMediaFlacFrameConverter::setFrameHeaderInfo(sp<ABuffer>& inBuffer, sp<ABu
     const uint32_t bodySize = static_cast<uint32_t>(inSize - 2 - (info.crc8Pos + 1));
     memcpy(dst + outPos, in + info.crc8Pos + 1, bodySize);
     outPos += bodySize;
-    const uint16_t frameCrc = crc16Fast(0, dst, outDataSize - 2);
+    const uint16_t frameCrc = crc16TwoRuns(0, dst, outDataSize - 2);
     dst[outPos++] = static_cast<unsigned char>(frameCrc >> 8);
     dst[outPos++] = static_cast<unsigned char>(frameCrc & 0xFF);
     if (outPos != outDataSize) {
@@ -355,7 +409,7 @@ uint16_t QNMediaFlacFrameConverter::crc16(const unsigned char* data, uint32_t si
 }
 
 uint16_t QNMediaFlacFrameConverter::crc16Sliced(const unsigned char* data, uint32_t size) {
-    return crc16Fast(0, data, size);
+    return crc16TwoRuns(0, data, size);
 }
 
 }  // namespace qnmediaeditor

@@ -4,12 +4,13 @@
 
 #include <cstring>
 
-#if defined(__SSE2__)
-#include <emmintrin.h>
-#endif
-
 #include <log/log.h>
 #include <media/stagefright/MediaErrors.h>
+#include <media/stagefright/foundation/CpuFeatures.h>
+
+#if ME_X86_KERNELS
+#include <immintrin.h>
+#endif
 
 #include "QNMediaEditorDefs.h"
 
@@ -67,56 +68,112 @@ inline void store4x24(uint8_t* out, uint32_t a, uint32_t b, uint32_t c, uint32_t
     memcpy(out + 8, &hi, 4);
 }
 
-int packFloatsFast(const float* in, uint8_t* out, int count) {
+#if ME_X86_KERNELS
+// Eight samples at a time: all 32 input bytes are loaded before the 24
+// output bytes are stored, so in-place packing is safe. Each 128-bit lane
+// holds 12 packed bytes and 4 spare ones. While another group follows, the
+// lanes are stored as 16 bytes each and the next group overwrites the 4
+// spare bytes (which land before any unread input); the last group stores
+// exactly 24 bytes so that nothing is written past the output.
+ME_TARGET_AVX2 inline void store24Overlapping(uint8_t* out, __m256i packed) {
+    _mm_storeu_si128(reinterpret_cast<__m128i*>(out), _mm256_castsi256_si128(packed));
+    _mm_storeu_si128(reinterpret_cast<__m128i*>(out + 12), _mm256_extracti128_si256(packed, 1));
+}
+
+ME_TARGET_AVX2 inline void store24Exact(uint8_t* out, __m256i packed) {
+    alignas(32) uint8_t lanes[32];
+    _mm256_store_si256(reinterpret_cast<__m256i*>(lanes), packed);
+    memcpy(out, lanes, 12);
+    memcpy(out + 12, lanes + 16, 12);
+}
+
+// Per 128-bit lane: bytes 0-2 of each 32-bit value, or bytes 1-3.
+ME_TARGET_AVX2 inline __m256i laneShuffle(int first) {
+    const char f = static_cast<char>(first);
+    return _mm256_setr_epi8(f, f + 1, f + 2, f + 4, f + 5, f + 6, f + 8, f + 9, f + 10, f + 12, f + 13, f + 14, -1, -1,
+                            -1, -1, f, f + 1, f + 2, f + 4, f + 5, f + 6, f + 8, f + 9, f + 10, f + 12, f + 13, f + 14,
+                            -1, -1, -1, -1);
+}
+
+// floatTo24 on eight lanes. NaN is zeroed and the clip done by clamping the
+// input: -1 and 1 - 2^-23 scale exactly to the two limits.
+ME_TARGET_AVX2 inline __m256i floatsTo24(const float* in) {
+    const __m256 x = _mm256_loadu_ps(in);
+    const __m256 clean = _mm256_and_ps(x, _mm256_cmp_ps(x, x, _CMP_ORD_Q));
+    const __m256 clamped =
+        _mm256_max_ps(_mm256_min_ps(clean, _mm256_set1_ps(kLargestBelowOne)), _mm256_set1_ps(-1.0f));
+    const __m256 product = _mm256_mul_ps(clamped, _mm256_set1_ps(8388608.0f));
+    const __m256i whole = _mm256_cvttps_epi32(product);
+    const __m256 rest = _mm256_sub_ps(product, _mm256_cvtepi32_ps(whole));
+    // Compare masks are -1 where true.
+    const __m256i up = _mm256_castps_si256(_mm256_cmp_ps(rest, _mm256_set1_ps(0.5f), _CMP_GE_OQ));
+    const __m256i down = _mm256_castps_si256(_mm256_cmp_ps(rest, _mm256_set1_ps(-0.5f), _CMP_LE_OQ));
+    return _mm256_add_epi32(_mm256_sub_epi32(whole, up), down);
+}
+
+ME_TARGET_AVX2 int packFloatsAvx2(const float* in, uint8_t* out, int count) {
+    const __m256i shuffle = laneShuffle(0);
     int i = 0;
-#if defined(__SSE2__)
-    const __m128 scale = _mm_set1_ps(8388608.0f);
-    const __m128 half = _mm_set1_ps(0.5f);
-    const __m128 minusHalf = _mm_set1_ps(-0.5f);
-    const __m128 minusOne = _mm_set1_ps(-1.0f);
-    const __m128 top = _mm_set1_ps(kLargestBelowOne);
-    const __m128i lowest = _mm_set1_epi32(-8388608);
-    const __m128i highest = _mm_set1_epi32(8388607);
-    alignas(16) int32_t v[4];
-    for (; i + 4 <= count; i += 4) {
-        const __m128 x = _mm_loadu_ps(in + i);
-        const __m128 product = _mm_mul_ps(x, scale);
-        __m128i whole = _mm_cvttps_epi32(product);
-        const __m128 rest = _mm_sub_ps(product, _mm_cvtepi32_ps(whole));
-        // Compare masks are -1 where true.
-        whole = _mm_sub_epi32(whole, _mm_castps_si128(_mm_cmpge_ps(rest, half)));
-        whole = _mm_add_epi32(whole, _mm_castps_si128(_mm_cmple_ps(rest, minusHalf)));
-        const __m128i low = _mm_castps_si128(_mm_cmple_ps(x, minusOne));
-        whole = _mm_or_si128(_mm_and_si128(low, lowest), _mm_andnot_si128(low, whole));
-        const __m128i high = _mm_castps_si128(_mm_cmpge_ps(x, top));
-        whole = _mm_or_si128(_mm_and_si128(high, highest), _mm_andnot_si128(high, whole));
-        whole = _mm_andnot_si128(_mm_castps_si128(_mm_cmpunord_ps(x, x)), whole);
-        _mm_store_si128(reinterpret_cast<__m128i*>(v), whole);
-        store4x24(out + 3 * i, v[0], v[1], v[2], v[3]);
-    }
-#else
+    for (; i + 16 <= count; i += 8) store24Overlapping(out + 3 * i, _mm256_shuffle_epi8(floatsTo24(in + i), shuffle));
+    for (; i + 8 <= count; i += 8) store24Exact(out + 3 * i, _mm256_shuffle_epi8(floatsTo24(in + i), shuffle));
+    return i;
+}
+
+ME_TARGET_AVX2 inline __m256i load8(const uint32_t* in) {
+    return _mm256_loadu_si256(reinterpret_cast<const __m256i*>(in));
+}
+
+ME_TARGET_AVX2 int packWordsAvx2(const uint32_t* in, uint8_t* out, int count) {
+    const __m256i shuffle = laneShuffle(1);
+    int i = 0;
+    for (; i + 16 <= count; i += 8) store24Overlapping(out + 3 * i, _mm256_shuffle_epi8(load8(in + i), shuffle));
+    for (; i + 8 <= count; i += 8) store24Exact(out + 3 * i, _mm256_shuffle_epi8(load8(in + i), shuffle));
+    return i;
+}
+#endif
+
+}  // namespace
+
+// The portable fast paths, four samples per step; outside the anonymous
+// namespace so that tests can hold them against the plain definition on
+// machines that would otherwise take the vector kernels.
+namespace detail {
+
+int packFloatsPortable(const float* in, uint8_t* out, int count) {
+    int i = 0;
     for (; i + 4 <= count; i += 4) {
         const int32_t a = floatTo24(load(in + i)), b = floatTo24(load(in + i + 1));
         const int32_t c = floatTo24(load(in + i + 2)), d = floatTo24(load(in + i + 3));
         store4x24(out + 3 * i, a, b, c, d);
     }
-#endif
     return i;
 }
 
-int packWordsFast(const uint32_t* in, uint8_t* out, int count) {
+int packWordsPortable(const uint32_t* in, uint8_t* out, int count) {
     int i = 0;
     for (; i + 4 <= count; i += 4) {
-        uint64_t ab, cd;
-        memcpy(&ab, in + i, 8);
-        memcpy(&cd, in + i + 2, 8);
-        // The top 24 bits of each word: bits 8-31 of a, 40-63 of ab, and so on.
-        const uint64_t lo = ((ab >> 8) & 0xFFFFFF) | ((ab >> 40) << 24) | (((cd >> 8) & 0xFFFF) << 48);
-        const uint32_t hi = static_cast<uint32_t>(((cd >> 24) & 0xFF) | ((cd >> 40) << 8));
-        memcpy(out + 3 * i, &lo, 8);
-        memcpy(out + 3 * i + 8, &hi, 4);
+        const uint32_t a = load(in + i), b = load(in + i + 1), c = load(in + i + 2), d = load(in + i + 3);
+        store4x24(out + 3 * i, a >> 8, b >> 8, c >> 8, d >> 8);
     }
     return i;
+}
+
+}  // namespace detail
+
+namespace {
+
+int packFloatsFast(const float* in, uint8_t* out, int count) {
+#if ME_X86_KERNELS
+    if (cpuHasAvx2()) return packFloatsAvx2(in, out, count);
+#endif
+    return detail::packFloatsPortable(in, out, count);
+}
+
+int packWordsFast(const uint32_t* in, uint8_t* out, int count) {
+#if ME_X86_KERNELS
+    if (cpuHasAvx2()) return packWordsAvx2(in, out, count);
+#endif
+    return detail::packWordsPortable(in, out, count);
 }
 
 template <typename Buffer>

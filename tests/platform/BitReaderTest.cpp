@@ -3,6 +3,7 @@
 #include <media/stagefright/foundation/ABitReader.h>
 #include <media/stagefright/foundation/avc_utils.h>
 
+#include <random>
 #include <vector>
 
 using namespace android;
@@ -140,4 +141,29 @@ TEST(AnnexBSplitTest, FindsStartCodesAndSplitsUnits) {
     EXPECT_EQ((std::vector<uint8_t>{0x68, 0xCE}), units[1]);
     EXPECT_EQ((std::vector<uint8_t>{0x65}), units[2]);
     EXPECT_EQ(0u, n);
+}
+
+TEST(AnnexBSplitTest, StartCodeSearchAgreesWithAPlainScanEverywhere) {
+    auto plain = [](const uint8_t* p, size_t n) {
+        for (size_t i = 0; i + 3 <= n; ++i) {
+            if (p[i] == 0 && p[i + 1] == 0 && p[i + 2] == 1) return i;
+        }
+        return n;
+    };
+    std::mt19937 rng(5);
+    for (int round = 0; round < 4000; ++round) {
+        std::vector<uint8_t> b(rng() % 100);
+        for (uint8_t& x : b) x = rng() % 4 == 0 ? 0 : static_cast<uint8_t>(rng() % 8 == 0 ? 1 : 0x80 | rng());
+        if (!b.empty() && round % 2 == 0) {  // plant one start code anywhere, maybe cut at the end
+            const size_t at = rng() % b.size();
+            for (size_t k = 0; k < 3 && at + k < b.size(); ++k) b[at + k] = k == 2 ? 1 : 0;
+        }
+        // Exactly sized heap copies: a read past the end is caught.
+        const std::vector<uint8_t> copy = b;
+        for (size_t from = 0; from <= std::min<size_t>(copy.size(), 3); ++from) {
+            const size_t expected = plain(copy.data() + from, copy.size() - from);
+            EXPECT_EQ(expected, findStartCodePrefix(copy.data() + from, copy.size() - from));
+            EXPECT_EQ(expected, findStartCodePrefixPortable(copy.data() + from, copy.size() - from));
+        }
+    }
 }

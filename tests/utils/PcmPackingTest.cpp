@@ -15,6 +15,13 @@
 using namespace android;
 using namespace android::qnmediaeditor;
 
+// The portable kernels, which machines with vector units do not reach
+// through the public operations.
+namespace android::qnmediaeditor::detail {
+int packFloatsPortable(const float* in, uint8_t* out, int count);
+int packWordsPortable(const uint32_t* in, uint8_t* out, int count);
+}  // namespace android::qnmediaeditor::detail
+
 namespace {
 
 // The definition, written out plainly: clip, scale in single precision,
@@ -105,9 +112,17 @@ TEST(PcmPackingTest, FloatPathMatchesTheReferenceBitForBit) {
     }
     const Bytes expected = referencePackFloats(in);
     for (size_t misalign : {0, 1, 3}) EXPECT_EQ(expected, packInPlace(in, misalign)) << misalign;
-    // Counts that leave a tail after the four-sample groups.
-    for (size_t n : {1, 2, 3, 5, 7}) {
-        std::vector<float> part(in.begin() + 10, in.begin() + 10 + n);
+    Bytes portable(3 * in.size());
+    const int done = detail::packFloatsPortable(in.data(), portable.data(), static_cast<int>(in.size()));
+    ASSERT_EQ(in.size() / 4 * 4, size_t(done));
+    EXPECT_EQ(Bytes(expected.begin(), expected.begin() + 3 * done), Bytes(portable.begin(), portable.begin() + 3 * done));
+    // Every count up to a few vector groups, into an exactly sized output:
+    // tails are handled and nothing is written past the end.
+    for (size_t n = 1; n <= 40; ++n) {
+        const std::vector<float> part(in.begin() + 10, in.begin() + 10 + n);
+        std::vector<uint8_t> out(3 * n);
+        QNMediaEditorUtils::ConvertXto24packed(const_cast<float*>(part.data()), out.data(), static_cast<int>(n), false);
+        EXPECT_EQ(referencePackFloats(part), out) << n;
         EXPECT_EQ(referencePackFloats(part), packInPlace(part, 0)) << n;
     }
 }
@@ -118,7 +133,11 @@ TEST(PcmPackingTest, IntegerWordsKeepTheirTopBytes) {
     std::vector<uint32_t> in;
     std::mt19937 rng(99);
     for (int i = 0; i < 100003; ++i) in.push_back(rng());
-    for (size_t misalign : {0, 2}) EXPECT_EQ(referencePackWords(in), packInPlace(in, misalign));
+    const Bytes expected = referencePackWords(in);
+    for (size_t misalign : {0, 2}) EXPECT_EQ(expected, packInPlace(in, misalign));
+    Bytes portable(3 * in.size());
+    const int done = detail::packWordsPortable(in.data(), portable.data(), static_cast<int>(in.size()));
+    EXPECT_EQ(Bytes(expected.begin(), expected.begin() + 3 * done), Bytes(portable.begin(), portable.begin() + 3 * done));
 
     // Separate output, and the other byte order.
     uint32_t words[2] = {0x12345678, 0xA1B2C3D4};

@@ -35,7 +35,10 @@ struct HEVCSPSInfo {
 void parseHEVCSPS(const uint8_t* payload, size_t size, HEVCSPSInfo* info);
 
 // Offset of the first 00 00 01 in data[0, size), or size when there is none.
+// Uses vector instructions where the machine has them; the portable form
+// gives the same answers everywhere.
 size_t findStartCodePrefix(const uint8_t* data, size_t size);
+size_t findStartCodePrefixPortable(const uint8_t* data, size_t size);
 
 // Splits an Annex-B stream: on true *unit/*unitSize hold the next NAL unit
 // (trailing zero bytes dropped) and *data/*size move past it. False when no

@@ -56,7 +56,7 @@ bool FlacStreamHeader::parse(const uint8_t* data, size_t size, FlacStreamHeader*
     }
     size_t pos = 0;
     if (size >= 4 && memcmp(data, kMarker, 4) == 0) pos = 4;
-    bool haveInfo = false;
+    bool haveInfo = false, sawLast = false;
     while (pos + 4 <= size) {
         const uint8_t type = data[pos] & 0x7F;
         const bool last = (data[pos] & 0x80) != 0;
@@ -72,9 +72,10 @@ bool FlacStreamHeader::parse(const uint8_t* data, size_t size, FlacStreamHeader*
             h.kept.push_back({type, std::vector<uint8_t>(body, body + length)});
         }
         pos += length;
-        if (last) break;
+        if ((sawLast = last)) break;
     }
-    if (!haveInfo) return false;
+    // Bytes left over that cannot hold a block header: cut short.
+    if (!haveInfo || (!sawLast && pos != size)) return false;
     *out = h;
     return true;
 }

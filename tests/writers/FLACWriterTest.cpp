@@ -9,6 +9,7 @@
 #include "LogCapture.h"
 #include "QNMediaFlacFrameConverter.h"
 #include "flac/FlacFrameHeader.h"
+#include "flac/FlacStreamHeader.h"
 #include "writers/AudioWriterTestSupport.h"
 
 using namespace android;
@@ -330,4 +331,36 @@ TEST(FLACWriterTest, HeaderlessFramesEmptyStreamsAndRefusals) {
         EXPECT_EQ(INVALID_OPERATION, writer->setUserMessage(reinterpret_cast<const uint8_t*>("late")));
         EXPECT_EQ(OK, writer->stop());
     }
+}
+
+TEST(FLACWriterTest, StreamHeaderFormsAndDamagedHeaders) {
+    // STREAMINFO: blocks 4096, 44100 Hz, 2 channels, 16 bits.
+    Bytes info(34, 0);
+    info[0] = 0x10, info[2] = 0x10;
+    info[10] = 0x0A, info[11] = 0xC4, info[12] = 0x42, info[13] = 0xF0;
+    Bytes block = {0x00, 0x00, 0x00, 0x22};
+    block.insert(block.end(), info.begin(), info.end());
+    Bytes full = {'f', 'L', 'a', 'C'};
+    full.insert(full.end(), block.begin(), block.end());  // last flag clear, nothing after
+    const Bytes comment = {0x84, 0, 0, 8, 0, 0, 0, 0, 0, 0, 0, 0};
+    Bytes withComment = full;
+    withComment.insert(withComment.end(), comment.begin(), comment.end());
+
+    for (const Bytes* form : {&info, &block, &full, &withComment}) {
+        FlacStreamHeader h;
+        ASSERT_TRUE(FlacStreamHeader::parse(form->data(), form->size(), &h));
+        EXPECT_EQ(44100u, h.info.sampleRate);
+        EXPECT_EQ(2u, h.info.channels);
+        EXPECT_EQ(16u, h.info.bitsPerSample);
+        EXPECT_EQ(form == &withComment ? 1u : 0u, h.kept.size());
+    }
+    // A block running past the end, a first block that is not STREAMINFO.
+    FlacStreamHeader h;
+    for (size_t cut = 1; cut < withComment.size(); ++cut) {
+        const bool ok = FlacStreamHeader::parse(withComment.data(), cut, &h);
+        EXPECT_EQ(cut == full.size() || cut == 34, ok) << cut;
+    }
+    Bytes wrongFirst = full;
+    wrongFirst[4] = 0x04;
+    EXPECT_FALSE(FlacStreamHeader::parse(wrongFirst.data(), wrongFirst.size(), &h));
 }

@@ -1,6 +1,8 @@
 #include <gtest/gtest.h>
 
+#include <csignal>
 #include <cmath>
+#include <sys/resource.h>
 #include <map>
 
 #include <media/stagefright/MediaDefs.h>
@@ -327,4 +329,40 @@ TEST(WAVEWriterTest, TheWaveExtractorReadsBackSamplesAndItems) {
     EXPECT_EQ(ERROR_END_OF_STREAM, audiotest::ReadSamples(track, &samples));
     track->stop();
     EXPECT_TRUE(audiotest::Concat(samples) == pcm);
+}
+
+TEST(WAVEWriterTest, AWriteFailureMidStreamIsReportedAndNeverBlocksTheProducer) {
+    // The file may not grow past 64 KiB: writes beyond fail instead of
+    // raising the signal.
+    struct rlimit saved;
+    ASSERT_EQ(0, getrlimit(RLIMIT_FSIZE, &saved));
+    struct rlimit small = saved;
+    small.rlim_cur = 64 * 1024;
+    void (*previous)(int) = signal(SIGXFSZ, SIG_IGN);
+    ASSERT_EQ(0, setrlimit(RLIMIT_FSIZE, &small));
+
+    ScratchFile file(".wav");
+    sp<QNWAVEWriter> writer = new QNWAVEWriter(file.fd);
+    sp<MediaAdapter> source = makeSource(pcmFormat(2, 44100, kAudioEncodingPcm16bit));
+    ASSERT_EQ(OK, writer->addSource(source));
+    ASSERT_EQ(OK, writer->start());
+    LogCapture logs;
+    // Far more buffers than the adapter queues: the writer keeps taking them.
+    for (int i = 0; i < 300; ++i) push(source, Bytes(4096, uint8_t(i)));
+    const status_t err = writer->stop();
+
+    setrlimit(RLIMIT_FSIZE, &saved);
+    signal(SIGXFSZ, previous);
+    EXPECT_EQ(ERROR_IO, err);
+    EXPECT_TRUE(logs.containsAt(ANDROID_LOG_ERROR, "dropping the rest"));
+    // The header describes the samples that were written in full (a
+    // partly written one may follow them).
+    const Bytes f = file.bytes();
+    ASSERT_GE(f.size(), 44u);
+    EXPECT_EQ(0, memcmp(f.data(), "RIFF", 4));
+    const uint32_t data = le32(f.data() + 40);
+    EXPECT_GT(data, 0u);
+    EXPECT_EQ(0u, data % 4096);
+    EXPECT_LE(44u + data, f.size());
+    EXPECT_EQ(36u + data, le32(f.data() + 4));
 }

@@ -9,7 +9,9 @@
 
 namespace android {
 
-// RIFF/WAVE from PCM, with the device's items in chunks of their own.
+// RIFF/WAVE from PCM, with the device's items in chunks of their own after
+// "data": "wafm" (waveform values), "umsg" (user message text), "rmod"
+// (recording meta text), "bksz" (bookmark size, little-endian int64).
 class QNWAVEWriter : public MediaWriter {
 public:
     explicit QNWAVEWriter(int fd);

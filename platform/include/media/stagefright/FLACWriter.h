@@ -10,7 +10,9 @@
 namespace android {
 
 // Native FLAC from compressed frames or from PCM (encoded here), with the
-// device's items in metadata blocks of their own.
+// device's items in APPLICATION metadata blocks before the frames: "umsg"
+// (user message text), "rmod" (recording meta text), "bksz" (bookmark size,
+// big-endian int64), "wafm" (waveform values).
 class FLACWriter : public MediaWriter {
 public:
     explicit FLACWriter(int fd);

@@ -364,3 +364,25 @@ TEST(FLACWriterTest, StreamHeaderFormsAndDamagedHeaders) {
     wrongFirst[4] = 0x04;
     EXPECT_FALSE(FlacStreamHeader::parse(wrongFirst.data(), wrongFirst.size(), &h));
 }
+
+TEST(FLACWriterTest, LateWaveformWithoutRoomOnAWriteOnlyDescriptor) {
+    if (!haveTool("flac")) GTEST_SKIP() << "flac missing";
+    ScratchFile file(".flac");
+    const int writeOnly = open(file.path().c_str(), O_WRONLY);
+    ASSERT_GE(writeOnly, 0);
+    sp<FLACWriter> writer = new FLACWriter(writeOnly);
+    sp<MediaAdapter> source = makeSource(pcmFormat(1, 44100, kAudioEncodingPcm16bit));
+    ASSERT_EQ(OK, writer->addSource(source));
+    ASSERT_EQ(OK, writer->start());
+    pushInPieces(source, tone16(1, 44100, 44100), 4096);
+    const Bytes waveform(40000, 0x5A);
+    writer->setWaveform(waveform.data(), 20000);
+    LogCapture logs;
+    // The frames cannot be moved: the waveform is reported lost, the file stays whole.
+    EXPECT_EQ(ERROR_IO, writer->stop());
+    close(writeOnly);
+    EXPECT_TRUE(logs.containsAt(ANDROID_LOG_ERROR, "no room for the waveform"));
+    const Bytes f = file.bytes();
+    EXPECT_EQ(nullptr, application(f, flacBlocks(f), "wafm"));
+    EXPECT_TRUE(flacTests(file.path()));
+}

@@ -91,6 +91,12 @@ status_t MPEG4Extractor::readMovie(const ByteReader& moov) {
         ALOGW("no usable movie header");
         return ERROR_MALFORMED;
     }
+    // Fragments would hold samples this extractor does not read; handing
+    // out the rest would silently cut the file short.
+    if (mpeg4::FindChild(moov, FourCC('m', 'v', 'e', 'x'), &box)) {
+        ALOGW("fragmented movie files are not supported");
+        return ERROR_UNSUPPORTED;
+    }
     mpeg4::BoxIterator it(moov);
     while (it.next()) {
         if (it.header().type != FourCC('t', 'r', 'a', 'k')) continue;

@@ -254,7 +254,7 @@ TEST_P(MPEG4FileTest, SeekModesLandOnTheRightSyncSample) {
 }
 
 INSTANTIATE_TEST_SUITE_P(Files, MPEG4FileTest,
-                         ::testing::Values("avc_aac.mp4", "avc_aac_faststart.mp4", "hevc.mp4", "aac.m4a",
+                         ::testing::Values("avc_aac.mp4", "avc_aac_faststart.mp4", "avc_aac.mov", "hevc.mp4", "aac.m4a",
                                            "avc_rotated.mp4", "amr_nb.3gp"),
                          [](const ::testing::TestParamInfo<const char*>& info) {
                              std::string name = info.param;

@@ -24,6 +24,8 @@ ff "${video[@]}" $(tone 44100) -t 2 \
    "$dir/avc_aac.mp4"
 # The same samples with the index first.
 ff -i "$dir/avc_aac.mp4" -map 0 -c copy -movflags +faststart "$dir/avc_aac_faststart.mp4"
+# And in a QuickTime file, whose sound description keeps the esds in a 'wave' box.
+ff -i "$dir/avc_aac.mp4" -map 0 -c copy -f mov "$dir/avc_aac.mov"
 
 # HEVC (hvc1) with B-frames, no audio.
 ff "${video[@]}" -t 1 -c:v libx265 -preset veryfast -tag:v hvc1 -b:v 60k -pix_fmt yuv420p \
@@ -37,7 +39,7 @@ ff "${video[@]}" -t 0.5 -c:v libx264 -preset veryfast -bf 0 -g 5 -b:v 60k -pix_f
 ff -i "$tmp/plain.mp4" -map 0 -c copy -metadata:s:v:0 rotate=270 "$dir/avc_rotated.mp4"
 
 # AMR-NB in 3GP (ffmpeg has no AMR encoder; sox has).
-sox -n -r 8000 -c 1 -t amr-nb "$tmp/tone.amr" synth 1 sine 440
+sox -R -D -n -r 8000 -c 1 -t amr-nb "$tmp/tone.amr" synth 1 sine 440
 ff -i "$tmp/tone.amr" -c copy "$dir/amr_nb.3gp"
 
 facts() {
@@ -50,6 +52,6 @@ facts() {
     (.packets[] | . as $p | $s[$p.stream_index].time_base as $tb |
       "packet \($p.stream_index) \(us($p.pts; $tb)) \(us($p.dts; $tb)) \($p.size) \(if ($p.flags | startswith("K")) then 1 else 0 end)")'
 }
-for f in "$dir"/*.mp4 "$dir"/*.m4a "$dir"/*.3gp; do
+for f in "$dir"/*.mp4 "$dir"/*.mov "$dir"/*.m4a "$dir"/*.3gp; do
   facts "$f" > "$f.facts"
 done

@@ -127,7 +127,7 @@ status_t FLACWriter::Impl::checkSource(const sp<MetaData>& format) {
         layout = candidate;
         pcmInput = true;
     } else if (mime != nullptr && (strcasecmp(mime, MEDIA_MIMETYPE_AUDIO_FLAC) == 0 ||
-                                   // the device's variant carries the same frames
+                                   // the device's variant is taken as FLAC frames too
                                    strcasecmp(mime, KVU_MEDIA_MIMETYPE_AUDIO_FLAC_QNSW) == 0)) {
         pcmInput = false;
     } else {

@@ -41,10 +41,7 @@ public:
         unlink(mPath.c_str());
     }
     const std::string& path() const { return mPath; }
-    Bytes bytes() const {
-        std::ifstream in(mPath, std::ios::binary);
-        return Bytes(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
-    }
+    Bytes bytes() const;
     int fd = -1;
 
 private:
@@ -101,13 +98,15 @@ inline Bytes readFile(const std::string& path) {
     return Bytes(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
 }
 
+inline Bytes ScratchFile::bytes() const { return readFile(mPath); }
+
 inline void writeFile(const std::string& path, const Bytes& bytes) {
     std::ofstream out(path, std::ios::binary);
     out.write(reinterpret_cast<const char*>(bytes.data()), static_cast<std::streamsize>(bytes.size()));
 }
 
 // Interleaved 16-bit little-endian tones, a different pitch per channel.
-inline Bytes tone16(int channels, int frames, int sampleRate) {
+inline Bytes tone16(int channels, int frames) {
     Bytes out;
     out.reserve(static_cast<size_t>(frames) * channels * 2);
     uint32_t noise = 12345;
@@ -121,7 +120,6 @@ inline Bytes tone16(int channels, int frames, int sampleRate) {
             out.push_back(uint8_t(v >> 8));
         }
     }
-    (void)sampleRate;
     return out;
 }
 

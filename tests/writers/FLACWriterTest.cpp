@@ -92,7 +92,7 @@ struct ToolStream {
 
 bool makeToolStream(int frames16Stereo, ToolStream* out) {
     ScratchFile raw(".raw"), encoded(".flac");
-    out->pcm = tone16(2, frames16Stereo, 44100);
+    out->pcm = tone16(2, frames16Stereo);
     writeFile(raw.path(), out->pcm);
     if (run("flac -s -f --force-raw-format --endian=little --sign=signed --channels=2 --bps=16 "
             "--sample-rate=44100 --blocksize=1152 -o " + encoded.path() + " " + raw.path()) != 0) {
@@ -127,7 +127,7 @@ TEST(FLACWriterTest, EncodedPcmPassesTheFlacToolAndDecodesBack) {
         SCOPED_TRACE(c.encoding);
         Bytes pcm;
         if (c.bytesPerSample == 2) {
-            pcm = tone16(c.channels, 3 * 44100 + 77, 44100);
+            pcm = tone16(c.channels, 3 * 44100 + 77);
         } else {
             for (int i = 0; i < 2 * 44100 + 5; ++i) {
                 const int v = ((i % 300) - 150) * 50000;
@@ -252,7 +252,7 @@ TEST(FLACWriterTest, TrimmedFramesFromTheFrameConverterPassTheFlacTool) {
 
 TEST(FLACWriterTest, LateWaveformTakesThePaddingOrMovesTheFrames) {
     if (!haveTool("flac")) GTEST_SKIP() << "flac missing";
-    const Bytes pcm = tone16(1, 2 * 44100, 44100);
+    const Bytes pcm = tone16(1, 2 * 44100);
     for (const int count : {100, 20000}) {  // fits the padding / does not
         SCOPED_TRACE(count);
         ScratchFile file(".flac");
@@ -374,7 +374,7 @@ TEST(FLACWriterTest, LateWaveformWithoutRoomOnAWriteOnlyDescriptor) {
     sp<MediaAdapter> source = makeSource(pcmFormat(1, 44100, kAudioEncodingPcm16bit));
     ASSERT_EQ(OK, writer->addSource(source));
     ASSERT_EQ(OK, writer->start());
-    pushInPieces(source, tone16(1, 44100, 44100), 4096);
+    pushInPieces(source, tone16(1, 44100), 4096);
     const Bytes waveform(40000, 0x5A);
     writer->setWaveform(waveform.data(), 20000);
     LogCapture logs;

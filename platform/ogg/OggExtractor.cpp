@@ -1,7 +1,78 @@
-// Placeholder until the extractor lands.
+#define LOG_TAG "OggExtractor"
+#include "ogg/OggExtractor.h"
+
+#include <cstring>
+#include <new>
+
+#include <log/log.h>
+#include <media/stagefright/MediaDefs.h>
+
+#include "extractor/SeekPolicy.h"
 #include "extractor/Sniffers.h"
+#include "ogg/OggSource.h"
+#include "ogg/OggVorbisStream.h"
 
 namespace android {
-float SniffOgg(const sp<DataSource>&) { return 0.0f; }
-sp<IMediaExtractor> CreateOggExtractor(const sp<DataSource>&) { return nullptr; }
+
+sp<OggExtractor> OggExtractor::Create(const sp<DataSource>& source) {
+    std::shared_ptr<VorbisHeaders> headers(new (std::nothrow) VorbisHeaders);
+    if (headers == nullptr || headers->read(source) != OK) return nullptr;
+    return new OggExtractor(source, headers);
+}
+
+OggExtractor::OggExtractor(const sp<DataSource>& source, const std::shared_ptr<const VorbisHeaders>& headers)
+    : mSource(source), mHeaders(headers), mTrackMeta(new MetaData) {
+    MetaData* t = mTrackMeta.get();
+    t->setCString(kKeyMIMEType, MEDIA_MIMETYPE_AUDIO_VORBIS);
+    t->setInt32(kKeySampleRate, static_cast<int32_t>(headers->sampleRate()));
+    t->setInt32(kKeyChannelCount, headers->channels());
+    t->setData(kKeyVorbisInfo, 0, headers->identification().data(), headers->identification().size());
+    t->setData(kKeyVorbisBooks, 0, headers->setup().data(), headers->setup().size());
+    t->setInt32(kKeyMaxInputSize, static_cast<int32_t>(OggVorbisStream::kMaxPacketBytes));
+    const int64_t last = OggVorbisStream::LastGranule(source, headers->serial(), headers->audioStart());
+    int64_t durationUs = 0;
+    if (last > 0) {
+        durationUs = TicksToUs(static_cast<uint64_t>(last), headers->sampleRate());
+        t->setInt64(kKeyDuration, durationUs);
+    }
+    off64_t size;
+    if (headers->nominalBitrate() > 0 && headers->nominalBitrate() <= INT32_MAX) {
+        t->setInt32(kKeyBitRate, static_cast<int32_t>(headers->nominalBitrate()));
+    } else if (durationUs > 0 && source->getSize(&size) == OK && size > 0) {
+        const int64_t bitrate = static_cast<int64_t>(static_cast<__int128>(size) * 8000000 / durationUs);
+        if (bitrate <= INT32_MAX) t->setInt32(kKeyBitRate, static_cast<int32_t>(bitrate));
+    }
+}
+
+sp<IMediaSource> OggExtractor::getTrack(size_t index) {
+    if (index != 0) return nullptr;
+    return new OggSource(mSource, mHeaders, mTrackMeta);
+}
+
+sp<MetaData> OggExtractor::getTrackMetaData(size_t index, uint32_t /*flags*/) {
+    if (index != 0) return nullptr;
+    return new MetaData(*mTrackMeta);
+}
+
+sp<MetaData> OggExtractor::getMetaData() {
+    sp<MetaData> meta = new MetaData;
+    meta->setCString(kKeyMIMEType, MEDIA_MIMETYPE_CONTAINER_OGG);
+    return meta;
+}
+
+float SniffOgg(const sp<DataSource>& source) {
+    // The first page, and the Vorbis identification header at the start of
+    // its first packet (the page has at most 255 lacing values).
+    uint8_t head[27 + 255 + 7];
+    const ssize_t n = source->readAt(0, head, sizeof(head));
+    if (n < 27 || memcmp(head, "OggS", 4) != 0) return 0.0f;
+    const size_t body = 27 + head[26];
+    if (static_cast<size_t>(n) < body + 7) return 0.0f;
+    return memcmp(head + body, "\x01vorbis", 7) == 0 ? 0.8f : 0.0f;
+}
+
+sp<IMediaExtractor> CreateOggExtractor(const sp<DataSource>& source) {
+    return OggExtractor::Create(source);
+}
+
 }  // namespace android

@@ -17,10 +17,19 @@ constexpr size_t kReadSize = 64 * 1024;
 constexpr size_t kMaxHeaderBytes = 16;
 // Headers are looked for this far past the start; no frame is larger.
 constexpr size_t kMaxFrameBound = kMaxHeaderBytes + 8 * (2 + (65536 * 33 + 7) / 8) + 2;
+// Data full of headers that lead nowhere must not cost more than this much
+// checksumming per frame asked for.
+constexpr size_t kScanBudget = 8 * kMaxFrameBound;
 }  // namespace
 
 FLACFrameScanner::FLACFrameScanner(const sp<DataSource>& source, const FlacStreamInfo& info, off64_t firstFrame)
-    : mSource(source), mInfo(info), mFirstFrame(firstFrame), mEnd(INT64_MAX), mReadError(OK), mWindowStart(0) {
+    : mSource(source),
+      mInfo(info),
+      mFirstFrame(firstFrame),
+      mEnd(INT64_MAX),
+      mReadError(OK),
+      mBudget(kScanBudget),
+      mWindowStart(0) {
     off64_t size;
     if (mSource->getSize(&size) == OK && size >= 0) mEnd = size;
 }
@@ -104,7 +113,9 @@ bool FLACFrameScanner::findEnd(const FlacFrameHeader& header, FLACFrame* frame) 
         const bool atEnd = frame->offset + static_cast<off64_t>(available) >= mEnd;
         // A candidate end needs the bytes of the header that may follow it.
         const size_t usable = atEnd ? available : (available > kMaxHeaderBytes ? available - kMaxHeaderBytes : 0);
-        for (; k + 2 <= usable && k + 2 <= limit; ++k) {
+        const size_t stop = std::min(std::min(usable, limit), k + mBudget + 2);
+        mBudget -= stop > k + 2 ? stop - (k + 2) : 0;
+        for (; k + 2 <= stop; ++k) {
             if (k >= header.headerBytes && crc == ((p[k] << 8) | p[k + 1])) {
                 const size_t end = k + 2;
                 FlacFrameHeader next;
@@ -117,7 +128,7 @@ bool FLACFrameScanner::findEnd(const FlacFrameHeader& header, FLACFrame* frame) 
             }
             crc = FLACCrc16Update(crc, p[k]);
         }
-        if (atEnd || k + 2 > limit) break;
+        if (atEnd || k + 2 > limit || mBudget == 0) break;
         span = std::min(span * 2, limit + kMaxHeaderBytes);
     }
     // What follows the last frame may be a tag rather than a frame.
@@ -130,6 +141,7 @@ bool FLACFrameScanner::findEnd(const FlacFrameHeader& header, FLACFrame* frame) 
 
 status_t FLACFrameScanner::findFrame(off64_t from, FLACFrame* frame) {
     mReadError = OK;
+    mBudget = kScanBudget;
     from = std::max(from, mFirstFrame);
     // Give up on a region without a frame this long: no frame is larger.
     const off64_t searchSpan = static_cast<off64_t>(2 * kMaxFrameBound);
@@ -162,6 +174,10 @@ status_t FLACFrameScanner::findFrame(off64_t from, FLACFrame* frame) {
                 return OK;
             }
             if (mReadError != OK) return mReadError;
+            if (mBudget == 0) {
+                ALOGW("no whole frame found near %lld", (long long)at);
+                return ERROR_MALFORMED;
+            }
         }
         ++at;
     }

@@ -58,6 +58,7 @@ private:
     const off64_t mFirstFrame;
     off64_t mEnd;
     status_t mReadError;
+    size_t mBudget;  // bytes findEnd may still checksum in this findFrame
     std::vector<uint8_t> mWindow;
     off64_t mWindowStart;
 };

@@ -250,3 +250,24 @@ TEST(FLACExtractorTest, SurvivesTruncationAndCorruption) {
     ExerciseHostileCopies(bytes, 200, 499, CreateFLACExtractor,
                           [](IMediaExtractor* e) { e->setOutputFormatFlag(5); });
 }
+
+TEST(FLACExtractorTest, HeadersThatLeadNowhereCostBoundedWork) {
+    // Metadata, then one frame header repeated over and over: every copy
+    // parses, none is followed by a frame end. STREAMINFO claims the largest
+    // blocks and no known frame size, so each candidate may be scanned far.
+    std::vector<uint8_t> bytes = ReadFile("b1152.flac");
+    const size_t frames = FactInt("b1152.flac", "frame_offset");
+    bytes[8 + 2] = 0xFF;  // largest block size 65535
+    bytes[8 + 3] = 0xFF;
+    bytes[8 + 7] = bytes[8 + 8] = bytes[8 + 9] = 0;  // largest frame size unknown
+    std::vector<uint8_t> hostile(bytes.begin(), bytes.begin() + frames);
+    // Frame 0 of 65535 samples at 22050 Hz, mono, 16 bits, with its CRC-8.
+    const uint8_t frameHeader[] = {0xFF, 0xF8, 0x76, 0x08, 0x00, 0xFF, 0xFE, 0x72};
+    for (int i = 0; i < 50000; ++i) hostile.insert(hostile.end(), frameHeader, frameHeader + sizeof(frameHeader));
+    sp<IMediaExtractor> extractor = CreateFLACExtractor(MemorySource(hostile));
+    ASSERT_NE(extractor, nullptr);
+    extractor->setOutputFormatFlag(5);
+    status_t end;
+    const std::vector<Sample> samples = ReadTrack(extractor, &end, nullptr, 10);
+    EXPECT_NE(end, OK);
+}

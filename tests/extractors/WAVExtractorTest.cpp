@@ -178,6 +178,7 @@ TEST(WAVExtractorTest, RefusesFormatsItCannotDeliver) {
 }
 
 TEST(WAVExtractorTest, SurvivesTruncationAndCorruption) {
+    ExerciseHostileCopies(ReadFile("u8_mono.wav"), 8192, 1, CreateWAVExtractor);  // every prefix and byte
     for (const char* file : {"s24_ext_6ch.wav", "items.wav"}) {
         ExerciseHostileCopies(ReadFile(file), 128, 997, CreateWAVExtractor);
     }

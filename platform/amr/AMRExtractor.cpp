@@ -26,7 +26,7 @@ sp<AMRExtractor> AMRExtractor::Create(const sp<DataSource>& source) {
 }
 
 AMRExtractor::AMRExtractor(const sp<DataSource>& source, const sp<AMRFrameIndex>& index)
-    : mSource(source), mIndex(index), mTrackMeta(new MetaData) {
+    : SingleTrackExtractor(MEDIA_MIMETYPE_CONTAINER_AMR), mSource(source), mIndex(index) {
     const bool wide = index->isWide();
     mTrackMeta->setCString(kKeyMIMEType, wide ? MEDIA_MIMETYPE_AUDIO_AMR_WB : MEDIA_MIMETYPE_AUDIO_AMR_NB);
     mTrackMeta->setInt32(kKeyChannelCount, 1);
@@ -39,21 +39,7 @@ AMRExtractor::AMRExtractor(const sp<DataSource>& source, const sp<AMRFrameIndex>
     }
 }
 
-sp<IMediaSource> AMRExtractor::getTrack(size_t index) {
-    if (index != 0) return nullptr;
-    return new AMRSource(mSource, mIndex, mTrackMeta);
-}
-
-sp<MetaData> AMRExtractor::getTrackMetaData(size_t index, uint32_t /*flags*/) {
-    if (index != 0) return nullptr;
-    return new MetaData(*mTrackMeta);
-}
-
-sp<MetaData> AMRExtractor::getMetaData() {
-    sp<MetaData> meta = new MetaData;
-    meta->setCString(kKeyMIMEType, MEDIA_MIMETYPE_CONTAINER_AMR);
-    return meta;
-}
+sp<IMediaSource> AMRExtractor::createTrack() { return new AMRSource(mSource, mIndex, mTrackMeta); }
 
 float SniffAMR(const sp<DataSource>& source) {
     uint8_t head[9];

@@ -22,9 +22,8 @@ int32_t PcmEncodingFor(uint32_t bits) {
 }
 
 // What both output forms share.
-sp<MetaData> CommonTrackMeta(const FLACMetadata& meta, off64_t fileSize) {
+void SetCommonTrackMeta(MetaData* t, const FLACMetadata& meta, off64_t fileSize) {
     const FlacStreamInfo& info = meta.streamInfo;
-    sp<MetaData> t = new MetaData;
     t->setInt32(kKeySampleRate, static_cast<int32_t>(info.sampleRate));
     t->setInt32(kKeyChannelCount, static_cast<int32_t>(info.channels));
     t->setData(kKeyFlacStreamInfoRaw, 0, meta.streamInfoBlock, sizeof(meta.streamInfoBlock));
@@ -43,8 +42,7 @@ sp<MetaData> CommonTrackMeta(const FLACMetadata& meta, off64_t fileSize) {
             if (bitrate > 0 && bitrate <= INT32_MAX) t->setInt32(kKeyBitRate, static_cast<int32_t>(bitrate));
         }
     }
-    meta.items.publishTrackItems(t.get());
-    return t;
+    meta.items.publishTrackItems(t);
 }
 
 }  // namespace
@@ -60,41 +58,32 @@ sp<FLACExtractor> FLACExtractor::Create(const sp<DataSource>& source) {
 }
 
 FLACExtractor::FLACExtractor(const sp<DataSource>& source, const FLACMetadata& meta)
-    : mSource(source), mMeta(meta), mFileMeta(new MetaData) {
-    mFileMeta->setCString(kKeyMIMEType, MEDIA_MIMETYPE_CONTAINER_FLAC);
+    : SingleTrackExtractor(MEDIA_MIMETYPE_CONTAINER_FLAC), mSource(source), mMeta(meta), mRawMeta(new MetaData) {
     meta.items.publishFileItems(mFileMeta.get());
 
     off64_t fileSize;
     if (source->getSize(&fileSize) != OK) fileSize = -1;
     const FlacStreamInfo& info = meta.streamInfo;
 
-    mPcmMeta = CommonTrackMeta(meta, fileSize);
+    SetCommonTrackMeta(mTrackMeta.get(), meta, fileSize);
     const uint32_t bits = FLACDecoder::OutputBits(info.bitsPerSample);
-    mPcmMeta->setCString(kKeyMIMEType, MEDIA_MIMETYPE_AUDIO_RAW);
-    mPcmMeta->setInt32(kKeyBitsPerSample, static_cast<int32_t>(bits));
-    mPcmMeta->setInt32(kKeyDeviceBitsPerSample, static_cast<int32_t>(bits));
-    mPcmMeta->setInt32(kKeyPcmEncoding, PcmEncodingFor(bits));
-    mPcmMeta->setInt32(kKeyMaxInputSize, static_cast<int32_t>(info.maxBlockSize * info.channels * (bits / 8)));
+    mTrackMeta->setCString(kKeyMIMEType, MEDIA_MIMETYPE_AUDIO_RAW);
+    mTrackMeta->setInt32(kKeyBitsPerSample, static_cast<int32_t>(bits));
+    mTrackMeta->setInt32(kKeyDeviceBitsPerSample, static_cast<int32_t>(bits));
+    mTrackMeta->setInt32(kKeyPcmEncoding, PcmEncodingFor(bits));
+    mTrackMeta->setInt32(kKeyMaxInputSize, static_cast<int32_t>(info.maxBlockSize * info.channels * (bits / 8)));
 
-    mRawMeta = CommonTrackMeta(meta, fileSize);
+    SetCommonTrackMeta(mRawMeta.get(), meta, fileSize);
     mRawMeta->setCString(kKeyMIMEType, MEDIA_MIMETYPE_AUDIO_FLAC);
     mRawMeta->setInt32(kKeyBitsPerSample, static_cast<int32_t>(info.bitsPerSample));
     FLACFrameScanner scanner(source, info, meta.firstFrameOffset);
     mRawMeta->setInt32(kKeyMaxInputSize, static_cast<int32_t>(scanner.maxFrameSize()));
 }
 
-sp<IMediaSource> FLACExtractor::getTrack(size_t index) {
-    if (index != 0) return nullptr;
+sp<IMediaSource> FLACExtractor::createTrack() {
     if (rawOutput()) return new FLACRawSource(mSource, mMeta, mRawMeta);
-    return new FLACPcmSource(mSource, mMeta.streamInfo, mPcmMeta);
+    return new FLACPcmSource(mSource, mMeta.streamInfo, mTrackMeta);
 }
-
-sp<MetaData> FLACExtractor::getTrackMetaData(size_t index, uint32_t /*flags*/) {
-    if (index != 0) return nullptr;
-    return new MetaData(rawOutput() ? *mRawMeta : *mPcmMeta);
-}
-
-sp<MetaData> FLACExtractor::getMetaData() { return new MetaData(*mFileMeta); }
 
 float SniffFLAC(const sp<DataSource>& source) {
     uint8_t head[5];

@@ -21,7 +21,7 @@ sp<OggExtractor> OggExtractor::Create(const sp<DataSource>& source) {
 }
 
 OggExtractor::OggExtractor(const sp<DataSource>& source, const std::shared_ptr<const VorbisHeaders>& headers)
-    : mSource(source), mHeaders(headers), mTrackMeta(new MetaData) {
+    : SingleTrackExtractor(MEDIA_MIMETYPE_CONTAINER_OGG), mSource(source), mHeaders(headers) {
     MetaData* t = mTrackMeta.get();
     t->setCString(kKeyMIMEType, MEDIA_MIMETYPE_AUDIO_VORBIS);
     t->setInt32(kKeySampleRate, static_cast<int32_t>(headers->sampleRate()));
@@ -44,21 +44,7 @@ OggExtractor::OggExtractor(const sp<DataSource>& source, const std::shared_ptr<c
     }
 }
 
-sp<IMediaSource> OggExtractor::getTrack(size_t index) {
-    if (index != 0) return nullptr;
-    return new OggSource(mSource, mHeaders, mTrackMeta);
-}
-
-sp<MetaData> OggExtractor::getTrackMetaData(size_t index, uint32_t /*flags*/) {
-    if (index != 0) return nullptr;
-    return new MetaData(*mTrackMeta);
-}
-
-sp<MetaData> OggExtractor::getMetaData() {
-    sp<MetaData> meta = new MetaData;
-    meta->setCString(kKeyMIMEType, MEDIA_MIMETYPE_CONTAINER_OGG);
-    return meta;
-}
+sp<IMediaSource> OggExtractor::createTrack() { return new OggSource(mSource, mHeaders, mTrackMeta); }
 
 float SniffOgg(const sp<DataSource>& source) {
     // The first page, and the Vorbis identification header at the start of

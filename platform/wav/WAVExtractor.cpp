@@ -23,8 +23,7 @@ sp<WAVExtractor> WAVExtractor::Create(const sp<DataSource>& source) {
 }
 
 WAVExtractor::WAVExtractor(const sp<DataSource>& source, const WAVInfo& info)
-    : mSource(source), mInfo(info), mFileMeta(new MetaData), mTrackMeta(new MetaData) {
-    mFileMeta->setCString(kKeyMIMEType, MEDIA_MIMETYPE_CONTAINER_WAV);
+    : SingleTrackExtractor(MEDIA_MIMETYPE_CONTAINER_WAV), mSource(source), mInfo(info) {
     info.items.publishFileItems(mFileMeta.get());
 
     MetaData* t = mTrackMeta.get();
@@ -42,17 +41,7 @@ WAVExtractor::WAVExtractor(const sp<DataSource>& source, const WAVInfo& info)
     info.items.publishTrackItems(t);
 }
 
-sp<IMediaSource> WAVExtractor::getTrack(size_t index) {
-    if (index != 0) return nullptr;
-    return new WAVSource(mSource, mInfo, mTrackMeta);
-}
-
-sp<MetaData> WAVExtractor::getTrackMetaData(size_t index, uint32_t /*flags*/) {
-    if (index != 0) return nullptr;
-    return new MetaData(*mTrackMeta);
-}
-
-sp<MetaData> WAVExtractor::getMetaData() { return new MetaData(*mFileMeta); }
+sp<IMediaSource> WAVExtractor::createTrack() { return new WAVSource(mSource, mInfo, mTrackMeta); }
 
 float SniffWAV(const sp<DataSource>& source) {
     uint8_t head[12];

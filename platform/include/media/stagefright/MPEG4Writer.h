@@ -2,6 +2,7 @@
 #define MPEG4_WRITER_H_
 
 #include <memory>
+#include <string>
 
 #include <media/stagefright/MediaWriter.h>
 #include <utils/String8.h>
@@ -9,6 +10,35 @@
 namespace android {
 
 // ISO base media file writer (mp4): ftyp, streamed mdat, moov at the end.
+//
+// Tracks: H.264 (avc1/avcC), HEVC (hvc1/hvcC), AAC (mp4a/esds), AMR
+// (samr, sawb). One reader thread per source pulls its buffers (with read
+// options, so a MediaAdapter may wait for pushes) and appends the samples to
+// the media data as they come; only the sample tables stay in memory.
+// stop() waits until every source has reached its end of stream, then
+// writes the tables: nothing a source delivered is lost, and the file is
+// complete when stop() returns. start(params) reads kKeyRotation (the video
+// track header's matrix) and kKeyRealTimeRecording from the file metadata.
+//
+// The device's items, set before start() (INVALID_OPERATION after it,
+// except the waveform, taken until stop()):
+//
+//   item (setter)                      where                 stored as
+//   location (setGeoData)              moov/udta/\xA9xyz     16-bit length, 16-bit language,
+//                                                            "+DD.DDDD+DDD.DDDD/" (ISO 6709)
+//   sphere view (setUuidData)          top-level 'uuid'      extended type "QNED-SPHEREVIEW1",
+//                                      after moov            then the bytes as given
+//   recording type (setQNVideoFourCC)  moov/udta/qnrt        the text, no terminator
+//   waveform (setWaveform)             moov/udta/wafm        2 * count bytes as given
+//   M4A only (QNM4AWriter):
+//   user message (setUserMessage)      moov/udta/umsg        the text, no terminator
+//   VR metadata (setAudioRecodingMeta) moov/udta/rmod        the text, no terminator
+//   bookmark size (setRecodingParams,  moov/udta/bksz        8-byte big-endian int64
+//     "bookmark-size" int32 or int64)
+//
+// The extractor publishes them in the file metadata (location as
+// kKeyLocation; the sphere view as kEditorKeySphereView with one zero byte
+// appended), the bookmark size in the metadata of every audio track.
 class MPEG4Writer : public MediaWriter {
 public:
     explicit MPEG4Writer(int fd);
@@ -27,6 +57,14 @@ public:
 
 protected:
     ~MPEG4Writer() override;
+
+    enum class FileBrand { kMp4, kM4a };
+    MPEG4Writer(int fd, FileBrand brand);
+    // Items of the M4A variant; INVALID_OPERATION after start().
+    status_t setUserMessageItem(const std::string& text);
+    status_t setRecModeItem(const std::string& text);
+    // Null: nothing to store (still refused after start()).
+    status_t setBookmarkSizeItem(const int64_t* size);
 
     struct Impl;
     std::unique_ptr<Impl> mImpl;

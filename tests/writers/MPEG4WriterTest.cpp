@@ -1,0 +1,132 @@
+// MP4 writer: files written from synthetic sources, checked with ffprobe and
+// ffmpeg (skipped when they are missing) and by reading the boxes back.
+
+#include <fcntl.h>
+#include <unistd.h>
+
+#include <gtest/gtest.h>
+#include <media/stagefright/MPEG4Writer.h>
+#include <media/stagefright/MediaAdapter.h>
+#include <media/stagefright/MediaDefs.h>
+#include <media/stagefright/MediaErrors.h>
+
+#include "LogCapture.h"
+#include "writers/MPEG4TestSupport.h"
+
+using namespace android;
+using namespace mp4test;
+
+namespace {
+
+sp<MetaData> videoFormat(const char* mime, int32_t width, int32_t height) {
+    sp<MetaData> m = new MetaData;
+    m->setCString(kKeyMIMEType, mime);
+    m->setInt32(kKeyWidth, width);
+    m->setInt32(kKeyHeight, height);
+    return m;
+}
+
+sp<MetaData> audioFormat(const char* mime, int32_t rate, int32_t channels) {
+    sp<MetaData> m = new MetaData;
+    m->setCString(kKeyMIMEType, mime);
+    m->setInt32(kKeySampleRate, rate);
+    m->setInt32(kKeyChannelCount, channels);
+    return m;
+}
+
+class MPEG4WriterFileTest : public ::testing::Test {
+protected:
+    static void SetUpTestSuite() {
+        if (!haveTool("ffmpeg") || !haveTool("ffprobe")) return;
+        sDir = ::testing::TempDir() + "mp4w_sources";
+        runCommand("mkdir -p '" + sDir + "'");
+        const std::string common = "ffmpeg -nostdin -v error -y -f lavfi -i testsrc=size=160x120:rate=30 ";
+        sHaveSources =
+            runCommand(common + "-f lavfi -i sine=frequency=440:sample_rate=44100 -t 2 -pix_fmt yuv420p "
+                                "-c:v libx264 -bf 2 -g 15 -c:a aac -b:a 64k '" + sDir + "/avc.mp4'") == 0 &&
+            runCommand(common + "-t 1 -pix_fmt yuv420p -c:v libx265 -x265-params log-level=none:bframes=2 "
+                                "-tag:v hvc1 '" + sDir + "/hevc.mp4'") == 0;
+    }
+
+    void SetUp() override {
+        if (!sHaveSources) GTEST_SKIP() << "ffmpeg/ffprobe or their encoders are missing";
+        mDir = tempDir();
+    }
+
+    // Writes `samples` to OUT through a new writer; returns its path.
+    std::string write(const std::vector<sp<MetaData>>& formats, const std::vector<Pushed>& samples,
+                      MetaData* params = nullptr, const std::function<void(MPEG4Writer*)>& setup = nullptr) {
+        const std::string out = mDir + "/out.mp4";
+        const int fd = open(out.c_str(), O_CREAT | O_TRUNC | O_RDWR, 0644);
+        EXPECT_GE(fd, 0);
+        sp<MPEG4Writer> writer = new MPEG4Writer(fd);
+        if (setup) setup(writer.get());
+        const WriteResult r = writeThroughAdapters(writer, formats, samples, params);
+        EXPECT_EQ(OK, r.addSource);
+        EXPECT_EQ(OK, r.start);
+        EXPECT_EQ(OK, r.stop);
+        close(fd);
+        return out;
+    }
+
+    // Every stored packet has the size, times and key flag that were pushed
+    // (times compared after removing one constant decoding shift per track).
+    static void expectPackets(const std::string& path, const std::vector<Pushed>& pushed, bool exactDts) {
+        std::map<int, std::vector<Pushed>> in;
+        std::vector<uint8_t> dummy;
+        for (const Pushed& p : pushed) {
+            if (!p.config) in[int(p.track)].push_back(p);
+        }
+        std::map<int, std::vector<Packet>> out;
+        for (const Packet& p : packets(path)) out[p.stream].push_back(p);
+        ASSERT_EQ(in.size(), out.size());
+        for (auto& [track, list] : in) {
+            ASSERT_EQ(list.size(), out[track].size()) << "track " << track;
+            for (size_t i = 0; i < list.size(); ++i) {
+                const Packet& p = out[track][i];
+                SCOPED_TRACE("track " + std::to_string(track) + " sample " + std::to_string(i));
+                EXPECT_EQ(list[i].ptsUs, p.ptsUs);
+                EXPECT_EQ(list[i].sync, p.key);
+                EXPECT_LE(p.dtsUs, p.ptsUs);
+                if (exactDts) EXPECT_EQ(list[i].dtsUs, p.dtsUs);
+                if (i > 0) EXPECT_LT(out[track][i - 1].dtsUs, p.dtsUs);
+            }
+        }
+    }
+
+    static std::string sDir;
+    static bool sHaveSources;
+    std::string mDir;
+};
+
+std::string MPEG4WriterFileTest::sDir;
+bool MPEG4WriterFileTest::sHaveSources = false;
+
+TEST_F(MPEG4WriterFileTest, AnnexBH264AndAacFromConfigBuffers) {
+    const std::string src = sDir + "/avc.mp4";
+    const std::vector<Pushed> samples = samplesOf(src, /*annexB=*/true, /*configBuffers=*/true);
+    sp<MetaData> params = new MetaData;
+    params->setInt32(kKeyRotation, 90);
+    const std::string out = write({videoFormat(MEDIA_MIMETYPE_VIDEO_AVC, 160, 120),
+                                   audioFormat(MEDIA_MIMETYPE_AUDIO_AAC, 44100, 1)},
+                                  samples, params.get(), [](MPEG4Writer* w) {
+                                      EXPECT_EQ(OK, w->setGeoData(375000, -1222000));
+                                  });
+    expectPackets(out, samples, /*exactDts=*/true);
+    // Stored samples are the source's length-prefixed ones, byte for byte.
+    std::vector<Packet> srcPackets = packets(src), outPackets = packets(out);
+    ASSERT_EQ(srcPackets.size(), outPackets.size());
+    std::string errors;
+    EXPECT_TRUE(decodesCleanly(out, &errors)) << errors;
+    Flat f;
+    ASSERT_TRUE(probe(out, "-show_streams -show_format", &f));
+    EXPECT_EQ("-90", f["streams.stream.0.side_data_list.side_data.0.rotation"]);
+    EXPECT_EQ("+37.5000-122.2000/", f["format.tags.location"]);
+    EXPECT_EQ("h264", f["streams.stream.0.codec_name"]);
+    EXPECT_EQ("aac", f["streams.stream.1.codec_name"]);
+    // The avcC built from the Annex-B parameter sets equals the encoder's.
+    const std::vector<uint8_t> built = extradata(out, 0);
+    EXPECT_EQ(extradata(src, 0), built);
+}
+
+}  // namespace

@@ -214,7 +214,7 @@ std::map<std::string, std::vector<uint8_t>> childBoxes(const std::vector<uint8_t
     std::map<std::string, std::vector<uint8_t>> out;
     size_t begin = 0, end = file.size();
     std::string rest = path;
-    while (true) {
+    while (!rest.empty()) {
         const std::string want = rest.substr(0, rest.find('/'));
         bool found = false;
         for (size_t pos = begin; pos + 8 <= end;) {
@@ -229,8 +229,7 @@ std::map<std::string, std::vector<uint8_t>> childBoxes(const std::vector<uint8_t
             pos += size;
         }
         if (!found) return out;
-        if (rest.find('/') == std::string::npos) break;
-        rest = rest.substr(rest.find('/') + 1);
+        rest = rest.find('/') == std::string::npos ? "" : rest.substr(rest.find('/') + 1);
     }
     for (size_t pos = begin; pos + 8 <= end;) {
         const uint64_t size = (uint64_t(file[pos]) << 24) | (file[pos + 1] << 16) | (file[pos + 2] << 8) | file[pos + 3];

@@ -20,7 +20,8 @@
 namespace android {
 
 struct MPEG4Writer::Impl {
-    Impl(int fd, FileBrand brand) : fd(fd), m4a(brand == FileBrand::kM4a) {}
+    Impl(int fd, FileBrand brand)
+        : fd(fd), m4a(brand == FileBrand::kM4a), sharedItems(m4a ? "QNM4AWriter" : "MPEG4Writer") {}
 
     struct Slot {
         sp<MediaSource> source;
@@ -44,6 +45,7 @@ struct MPEG4Writer::Impl {
     sp<FdSink> sink;
     std::vector<std::unique_ptr<Slot>> slots;
     Mp4DeviceItems items;
+    WriterDeviceItems sharedItems;  // has its own lock
     int32_t rotation = 0;
     bool realTime = false;
     int64_t mdatStart = 0;
@@ -78,6 +80,7 @@ status_t MPEG4Writer::Impl::start(MetaData* params) {
     }
     auto fail = [this](status_t err) {
         state = State::kFailed;
+        sharedItems.close();
         result = err;
         return err;
     };
@@ -104,6 +107,7 @@ status_t MPEG4Writer::Impl::start(MetaData* params) {
         }
     }
     state = State::kStarted;
+    sharedItems.seal();
     running = slots.size();
     guard.unlock();
     for (size_t i = 0; i < slots.size(); ++i) {
@@ -170,6 +174,7 @@ status_t MPEG4Writer::Impl::stop() {
     }
     for (auto& slot : slots) slot->source->stop();
     std::lock_guard<std::mutex> guard(lock);
+    sharedItems.close();
     result = finishFile();
     state = State::kStopped;
     return result;
@@ -195,7 +200,7 @@ status_t MPEG4Writer::Impl::finishFile() {
     }
     if (finished.empty()) ALOGW("no samples were written; the file holds no track");
     Mp4BoxWriter tail;
-    Mp4WriteMovie(tail, finished, items, rotation);
+    Mp4WriteMovie(tail, finished, items, sharedItems.snapshot(), rotation);
     items.writeUuidBox(tail);
     if (tail.writeTo(sink.get()) != OK) {
         ALOGE("cannot write the movie box");
@@ -249,20 +254,9 @@ status_t MPEG4Writer::pause() { return ERROR_UNSUPPORTED; }
 
 bool MPEG4Writer::reachedEOS() { return mImpl->running == 0; }
 
-void MPEG4Writer::setWaveform(const uint8_t* data, int count) {
-    std::lock_guard<std::mutex> guard(mImpl->lock);
-    // Taken until stop() writes the movie box: the waveform is often ready
-    // only once the recording has been read through.
-    if (mImpl->state == Impl::State::kStopped || mImpl->state == Impl::State::kFailed) {
-        ALOGE("setWaveform() after stop() ignored");
-        return;
-    }
-    if (data == nullptr || count <= 0) {
-        mImpl->items.waveform.clear();
-        return;
-    }
-    mImpl->items.waveform.assign(data, data + 2 * static_cast<size_t>(count));
-}
+void MPEG4Writer::setWaveform(const uint8_t* data, int count) { mImpl->sharedItems.setWaveform(data, count); }
+
+WriterDeviceItems& MPEG4Writer::deviceItems() { return mImpl->sharedItems; }
 
 status_t MPEG4Writer::setGeoData(int latitude, int longitude) {
     std::lock_guard<std::mutex> guard(mImpl->lock);
@@ -291,30 +285,6 @@ status_t MPEG4Writer::setQNVideoFourCC(String8 fourcc) {
     if (err != OK) return err;
     mImpl->items.recordingType.assign(fourcc.string(), fourcc.length());
     return OK;
-}
-
-status_t MPEG4Writer::setUserMessageItem(const std::string& text) {
-    std::lock_guard<std::mutex> guard(mImpl->lock);
-    const status_t err = mImpl->checkIdle("setUserMessage()");
-    if (err == OK) mImpl->items.userMessage = text;
-    return err;
-}
-
-status_t MPEG4Writer::setRecModeItem(const std::string& text) {
-    std::lock_guard<std::mutex> guard(mImpl->lock);
-    const status_t err = mImpl->checkIdle("setAudioRecodingMeta()");
-    if (err == OK) mImpl->items.recMode = text;
-    return err;
-}
-
-status_t MPEG4Writer::setBookmarkSizeItem(const int64_t* size) {
-    std::lock_guard<std::mutex> guard(mImpl->lock);
-    const status_t err = mImpl->checkIdle("setRecodingParams()");
-    if (err == OK && size != nullptr) {
-        mImpl->items.hasBookmarkSize = true;
-        mImpl->items.bookmarkSize = *size;
-    }
-    return err;
 }
 
 }  // namespace android

@@ -8,9 +8,6 @@
 
 namespace android {
 
-const uint8_t kMp4SphereViewUuid[16] = {'Q', 'N', 'E', 'D', '-', 'S', 'P', 'H',
-                                        'E', 'R', 'E', 'V', 'I', 'E', 'W', '1'};
-
 status_t Mp4DeviceItems::FormatLocation(int latitude, int longitude, std::string* out) {
     if (latitude < -900000 || latitude > 900000 || longitude < -1800000 || longitude > 1800000) {
         return BAD_VALUE;
@@ -22,11 +19,10 @@ status_t Mp4DeviceItems::FormatLocation(int latitude, int longitude, std::string
     return OK;
 }
 
-void Mp4DeviceItems::writeUserData(Mp4BoxWriter& w) const {
-    if (location.empty() && recordingType.empty() && waveform.empty() && userMessage.empty() &&
-        recMode.empty() && !hasBookmarkSize) {
-        return;
-    }
+void Mp4DeviceItems::writeUserData(Mp4BoxWriter& w, const WriterDeviceItems::Snapshot& shared) const {
+    const bool any = !location.empty() || !recordingType.empty() || shared.hasWaveform || shared.hasUserMessage ||
+                     shared.hasRecMode || shared.hasBookmarkSize;
+    if (!any) return;
     w.beginBox("udta");
     if (!location.empty()) {
         // QuickTime-style text item: 16-bit length, 16-bit language ('eng').
@@ -37,12 +33,12 @@ void Mp4DeviceItems::writeUserData(Mp4BoxWriter& w) const {
         w.endBox();
     }
     if (!recordingType.empty()) w.leafBox("qnrt", recordingType.data(), recordingType.size());
-    if (!waveform.empty()) w.leafBox("wafm", waveform.data(), waveform.size());
-    if (!userMessage.empty()) w.leafBox("umsg", userMessage.data(), userMessage.size());
-    if (!recMode.empty()) w.leafBox("rmod", recMode.data(), recMode.size());
-    if (hasBookmarkSize) {
+    if (shared.hasWaveform) w.leafBox("wafm", shared.waveform.data(), shared.waveform.size());
+    if (shared.hasUserMessage) w.leafBox("umsg", shared.userMessage.data(), shared.userMessage.size());
+    if (shared.hasRecMode) w.leafBox("rmod", shared.recMode.data(), shared.recMode.size());
+    if (shared.hasBookmarkSize) {
         w.beginBox("bksz");
-        w.be64(static_cast<uint64_t>(bookmarkSize));
+        w.be64(static_cast<uint64_t>(shared.bookmarkSize));
         w.endBox();
     }
     w.endBox();
@@ -51,7 +47,9 @@ void Mp4DeviceItems::writeUserData(Mp4BoxWriter& w) const {
 void Mp4DeviceItems::writeUuidBox(Mp4BoxWriter& w) const {
     if (!hasUuid) return;
     w.beginBox("uuid");
-    w.bytes(kMp4SphereViewUuid, sizeof(kMp4SphereViewUuid));
+    static const char kSphereView[16] = {'Q', 'N', 'E', 'D', '-', 'S', 'P', 'H',
+                                         'E', 'R', 'E', 'V', 'I', 'E', 'W', '1'};
+    w.bytes(kSphereView, sizeof(kSphereView));
     w.bytes(uuidPayload);
     w.endBox();
 }

@@ -32,7 +32,7 @@ uint32_t Mp4ChooseMovieTimescale(const std::vector<const Mp4Track*>& tracks) {
 }
 
 void Mp4WriteMovie(Mp4BoxWriter& w, const std::vector<const Mp4Track*>& tracks, const Mp4DeviceItems& items,
-                   int32_t rotation) {
+                   const WriterDeviceItems::Snapshot& shared, int32_t rotation) {
     // Seconds since 1904-01-01, as the movie header counts them.
     const uint64_t now = static_cast<uint64_t>(time(nullptr)) + 2082844800ULL;
     const uint32_t created = now > UINT32_MAX ? 0 : static_cast<uint32_t>(now);
@@ -69,7 +69,7 @@ void Mp4WriteMovie(Mp4BoxWriter& w, const std::vector<const Mp4Track*>& tracks, 
     for (size_t i = 0; i < tracks.size(); ++i) {
         tracks[i]->writeTrak(w, static_cast<uint32_t>(i + 1), timescale, rotation, created);
     }
-    items.writeUserData(w);
+    items.writeUserData(w, shared);
     w.endBox();
 }
 

@@ -4,6 +4,8 @@
 #include <cstdint>
 #include <vector>
 
+#include "writer/WriterDeviceItems.h"
+
 namespace android {
 
 class Mp4BoxWriter;
@@ -16,7 +18,7 @@ void Mp4WriteFileType(Mp4BoxWriter& w, bool m4a);
 // 'moov' for finished tracks (track IDs 1, 2, ... in order), with the
 // device's user data.
 void Mp4WriteMovie(Mp4BoxWriter& w, const std::vector<const Mp4Track*>& tracks, const Mp4DeviceItems& items,
-                   int32_t rotation);
+                   const WriterDeviceItems::Snapshot& shared, int32_t rotation);
 
 // The movie time scale: the coarsest of 1000, 90000 and 1000000 in which
 // every track's presentation start is exact.

@@ -1,6 +1,7 @@
 #define LOG_TAG "Mp4SampleEntries"
 #include "mpeg4/Mp4SampleEntries.h"
 
+#include "media/CodecSpecificData.h"
 #include "mpeg4/Mp4BoxWriter.h"
 
 namespace android {
@@ -20,27 +21,6 @@ void audioFields(Mp4BoxWriter& w, uint16_t channels, uint32_t sampleRate) {
     w.be32(0);   // pre_defined, reserved
     // 16.16 rate; rates that do not fit are read from the codec's own config.
     w.be32(sampleRate <= 0xFFFF ? sampleRate << 16 : 0);
-}
-
-// Descriptor with a one-byte-per-7-bits size (ISO/IEC 14496-1 8.3.3).
-void descriptor(Mp4BoxWriter& w, uint8_t tag, size_t size) {
-    w.u8(tag);
-    uint8_t groups[4];
-    int n = 0;
-    do {
-        groups[n++] = static_cast<uint8_t>(size & 0x7F);
-        size >>= 7;
-    } while (size > 0 && n < 4);
-    while (n > 0) {
-        --n;
-        w.u8(static_cast<uint8_t>(groups[n] | (n > 0 ? 0x80 : 0)));
-    }
-}
-
-size_t descriptorSize(size_t payload) {
-    size_t lengthBytes = 1;
-    while (lengthBytes < 4 && payload >= (size_t(1) << (7 * lengthBytes))) ++lengthBytes;
-    return 1 + lengthBytes + payload;
 }
 
 }  // namespace
@@ -66,22 +46,8 @@ void Mp4WriteAacEntry(Mp4BoxWriter& w, const Mp4AacEntry& e) {
     sampleEntryHeader(w, "mp4a");
     audioFields(w, e.channels, e.sampleRate);
     w.beginFullBox("esds", 0, 0);
-    const size_t specific = descriptorSize(e.asc.size());
-    const size_t decoderConfig = descriptorSize(13 + specific);
-    const size_t slConfig = descriptorSize(1);
-    descriptor(w, 0x03, 3 + decoderConfig + slConfig);
-    w.be16(0);  // ES_ID
-    w.u8(0);    // no dependence, URL or OCR stream
-    descriptor(w, 0x04, 13 + specific);
-    w.u8(0x40);  // Audio ISO/IEC 14496-3
-    w.u8(0x15);  // audio stream
-    w.be24(e.bufferSize > 0xFFFFFF ? 0xFFFFFF : e.bufferSize);
-    w.be32(e.maxBitrate);
-    w.be32(e.avgBitrate);
-    descriptor(w, 0x05, e.asc.size());
-    w.bytes(e.asc);
-    descriptor(w, 0x06, 1);
-    w.u8(0x02);  // predefined SL config for MP4 files
+    // Audio ISO/IEC 14496-3 (0x40) in an audio stream (5).
+    w.bytes(makeEsds(0x40, 0x05, e.maxBitrate, e.avgBitrate, e.asc.data(), e.asc.size()));
     w.endBox();
     w.endBox();
 }

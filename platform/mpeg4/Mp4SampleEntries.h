@@ -17,11 +17,10 @@ struct Mp4AacEntry {
     std::vector<uint8_t> asc;  // AudioSpecificConfig
     uint32_t sampleRate;
     uint16_t channels;
-    uint32_t bufferSize;       // largest sample
     uint32_t maxBitrate;
     uint32_t avgBitrate;
 };
-// 'mp4a' with an 'esds' (ISO/IEC 14496-14 5.6, descriptors of 14496-1).
+// 'mp4a' with an 'esds' (ISO/IEC 14496-14 5.6).
 void Mp4WriteAacEntry(Mp4BoxWriter& w, const Mp4AacEntry& entry);
 
 // 'samr' or 'sawb' with its 'damr' (3GPP TS 26.244 6.5): `modeSet` has bit n

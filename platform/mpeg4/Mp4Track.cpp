@@ -7,6 +7,7 @@
 #include <media/stagefright/MediaDefs.h>
 #include <media/stagefright/MediaErrors.h>
 
+#include "media/CodecSpecificData.h"
 #include "mpeg4/Mp4BoxWriter.h"
 #include "mpeg4/Mp4ConfigRecords.h"
 #include "mpeg4/Mp4SampleEntries.h"
@@ -88,7 +89,11 @@ Mp4Track::Mp4Track(Codec codec, const sp<MetaData>& format) : mCodec(codec) {
             }
         }
     } else if (codec == Codec::kAac && format->findData(kKeyESDS, &type, &data, &size)) {
-        if (!Mp4AscFromEsds(static_cast<const uint8_t*>(data), size, &mRecord)) {
+        const uint8_t* asc = nullptr;
+        size_t ascSize = 0;
+        if (esdsDecoderSpecificInfo(static_cast<const uint8_t*>(data), size, &asc, &ascSize)) {
+            mRecord.assign(asc, asc + ascSize);
+        } else {
             ALOGW("ignoring an ES descriptor without AudioSpecificConfig");
         }
     }
@@ -117,9 +122,10 @@ void Mp4Track::collectParameterSets(const std::vector<NalSpan>& nals) {
 void Mp4Track::takeConfigBuffer(const uint8_t* data, size_t size) {
     if (mCodec == Codec::kAac) {
         if (!mRecord.empty()) return;
-        std::vector<uint8_t> asc;
-        if (Mp4AscFromEsds(data, size, &asc)) {
-            mRecord = asc;
+        const uint8_t* asc = nullptr;
+        size_t ascSize = 0;
+        if (esdsDecoderSpecificInfo(data, size, &asc, &ascSize)) {
+            mRecord.assign(asc, asc + ascSize);
         } else if (size >= 2) {
             mRecord.assign(data, data + size);
         }
@@ -217,19 +223,9 @@ std::vector<uint8_t> Mp4Track::buildConfig() const {
         case Codec::kHevc:
             return Mp4BuildHvcC(spans(mParameterSets[kVps]), spans(mParameterSets[kSps]),
                                 spans(mParameterSets[kPps]));
-        case Codec::kAac: {
-            // No config given: AAC-LC (or the given profile) at the format's rate.
-            static const uint32_t kRates[] = {96000, 88200, 64000, 48000, 44100, 32000, 24000,
-                                              22050, 16000, 12000, 11025, 8000,  7350};
-            int index = -1;
-            for (int i = 0; i < 13; ++i) {
-                if (kRates[i] == mSampleRate) index = i;
-            }
-            if (index < 0 || mChannels == 0 || mChannels > 7) return {};
-            const uint32_t objectType = 2;
-            return {static_cast<uint8_t>((objectType << 3) | (index >> 1)),
-                    static_cast<uint8_t>(((index & 1) << 7) | (mChannels << 3))};
-        }
+        case Codec::kAac:
+            // No config given: AAC-LC at the format's rate.
+            return Mp4MakeAacLcConfig(mSampleRate, mChannels);
         default:
             return {};
     }
@@ -285,8 +281,7 @@ void Mp4Track::writeSampleEntry(Mp4BoxWriter& w) const {
             const double seconds = mTiming.timescale ? double(mTiming.mediaDuration) / mTiming.timescale : 0;
             const double bitrate = seconds > 0 ? double(mTables.totalBytes()) * 8 / seconds : 0;
             const uint32_t avg = bitrate >= double(UINT32_MAX) ? UINT32_MAX : static_cast<uint32_t>(bitrate);
-            Mp4AacEntry e{mFinalConfig, mSampleRate, static_cast<uint16_t>(mChannels), mTables.maxSampleSize(),
-                          avg, avg};
+            Mp4AacEntry e{mFinalConfig, mSampleRate, static_cast<uint16_t>(mChannels), avg, avg};
             Mp4WriteAacEntry(w, e);
             break;
         }

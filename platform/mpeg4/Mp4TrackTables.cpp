@@ -28,7 +28,6 @@ void Mp4TrackTables::addSample(uint64_t offset, uint32_t size, int64_t dtsUs, in
     }
     ++mChunkSamples.back();
     mTotalBytes += size;
-    if (size > mMaxSize) mMaxSize = size;
 }
 
 void Mp4TrackTables::times(std::vector<int64_t>* dtsUs, std::vector<int64_t>* ptsUs) const {

@@ -23,7 +23,6 @@ public:
 
     size_t sampleCount() const { return mSizes.size(); }
     uint64_t totalBytes() const { return mTotalBytes; }
-    uint32_t maxSampleSize() const { return mMaxSize; }
 
     // Decoding and presentation times in microseconds, in decoding order.
     void times(std::vector<int64_t>* dtsUs, std::vector<int64_t>* ptsUs) const;
@@ -43,7 +42,6 @@ private:
     std::vector<uint64_t> mChunkOffsets;
     std::vector<uint32_t> mChunkSamples;
     uint64_t mTotalBytes = 0;
-    uint32_t mMaxSize = 0;
 };
 
 }  // namespace android

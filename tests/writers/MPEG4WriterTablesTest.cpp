@@ -170,21 +170,20 @@ TEST(MPEG4WriterNalUnits, AnnexBAndLengthPrefixedFraming) {
     EXPECT_FALSE(Mp4SplitAnnexB(big.data(), big.size(), &nals));
 }
 
-TEST(MPEG4WriterConfig, AudioSpecificConfigFromEsds) {
-    // With the box's version/flags and 4-byte descriptor sizes.
-    const std::vector<uint8_t> esds = {0, 0, 0, 0, 0x03, 0x80, 0x80, 0x80, 0x19, 0, 1, 0, 0x04, 0x80, 0x80, 0x80,
-                                       0x11, 0x40, 0x15, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0x05, 0x02, 0x12, 0x10,
-                                       0x06, 0x01, 0x02};
-    std::vector<uint8_t> asc;
-    ASSERT_TRUE(Mp4AscFromEsds(esds.data(), esds.size(), &asc));
-    EXPECT_EQ(std::vector<uint8_t>({0x12, 0x10}), asc);
+TEST(MPEG4WriterConfig, AudioSpecificConfig) {
     uint32_t rate = 0, channels = 0;
+    const std::vector<uint8_t> asc = {0x12, 0x10};
     ASSERT_TRUE(Mp4ParseAsc(asc.data(), asc.size(), &rate, &channels));
     EXPECT_EQ(44100u, rate);
     EXPECT_EQ(2u, channels);
-    // Truncated inside the decoder config.
-    EXPECT_FALSE(Mp4AscFromEsds(esds.data(), 20, &asc));
     EXPECT_FALSE(Mp4ParseAsc(asc.data(), 1, &rate, &channels));
+    // Explicit 24-bit rate (index 15).
+    const std::vector<uint8_t> explicitRate = {0x17, 0x80, 0x5D, 0xC0, 0x08};
+    ASSERT_TRUE(Mp4ParseAsc(explicitRate.data(), explicitRate.size(), &rate, &channels));
+    EXPECT_EQ(48000u, rate);
+    EXPECT_EQ(1u, channels);
+    EXPECT_EQ(asc, Mp4MakeAacLcConfig(44100, 2));
+    EXPECT_TRUE(Mp4MakeAacLcConfig(44000, 2).empty());
 }
 
 TEST(MPEG4WriterConfig, RecordsNeedTheirParameterSets) {

@@ -2,12 +2,13 @@
 #define MPEG4_WRITER_H_
 
 #include <memory>
-#include <string>
 
 #include <media/stagefright/MediaWriter.h>
 #include <utils/String8.h>
 
 namespace android {
+
+class WriterDeviceItems;
 
 // ISO base media file writer (mp4): ftyp, streamed mdat, moov at the end.
 //
@@ -60,11 +61,9 @@ protected:
 
     enum class FileBrand { kMp4, kM4a };
     MPEG4Writer(int fd, FileBrand brand);
-    // Items of the M4A variant; INVALID_OPERATION after start().
-    status_t setUserMessageItem(const std::string& text);
-    status_t setRecModeItem(const std::string& text);
-    // Null: nothing to store (still refused after start()).
-    status_t setBookmarkSizeItem(const int64_t* size);
+    // The items shared with the audio writers (waveform, user message, VR
+    // metadata, bookmark size).
+    WriterDeviceItems& deviceItems();
 
     struct Impl;
     std::unique_ptr<Impl> mImpl;

@@ -21,6 +21,17 @@ int64_t rescale(int64_t value, uint64_t from, uint64_t to) {
     return negative ? -static_cast<int64_t>(scaled) : static_cast<int64_t>(scaled);
 }
 
+// stts and ctts: entry count, then (sample count, value) pairs.
+void writeRuns(Mp4BoxWriter& w, const char type[4], const std::vector<Mp4TrackTiming::Run>& runs) {
+    w.beginFullBox(type, 0, 0);
+    w.be32(static_cast<uint32_t>(runs.size()));
+    for (const Mp4TrackTiming::Run& r : runs) {
+        w.be32(r.count);
+        w.be32(r.value);
+    }
+    w.endBox();
+}
+
 template <typename T>
 void appendRun(std::vector<Mp4TrackTiming::Run>* runs, T value) {
     const uint32_t v = static_cast<uint32_t>(value);
@@ -108,25 +119,10 @@ bool Mp4TrackTiming::tryTimescale(const std::vector<int64_t>& dtsUs, const std::
     return true;
 }
 
-void Mp4TrackTiming::writeDecodingTimes(Mp4BoxWriter& w) const {
-    w.beginFullBox("stts", 0, 0);
-    w.be32(static_cast<uint32_t>(stts.size()));
-    for (const Run& r : stts) {
-        w.be32(r.count);
-        w.be32(r.value);
-    }
-    w.endBox();
-}
+void Mp4TrackTiming::writeDecodingTimes(Mp4BoxWriter& w) const { writeRuns(w, "stts", stts); }
 
 void Mp4TrackTiming::writeCompositionOffsets(Mp4BoxWriter& w) const {
-    if (ctts.empty()) return;
-    w.beginFullBox("ctts", 0, 0);
-    w.be32(static_cast<uint32_t>(ctts.size()));
-    for (const Run& r : ctts) {
-        w.be32(r.count);
-        w.be32(r.value);
-    }
-    w.endBox();
+    if (!ctts.empty()) writeRuns(w, "ctts", ctts);
 }
 
 void Mp4TrackTiming::writeEdits(Mp4BoxWriter& w, uint32_t movieTimescale) const {

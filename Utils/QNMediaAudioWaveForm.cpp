@@ -195,50 +195,31 @@ void QNMediaAudioWaveForm::closeInterval() {
     mRightPeak = 0;
 }
 
-// Both widths walk the frames in runs that end where an interval closes, so the
-// per-frame work is only the peak compare.
 int QNMediaAudioWaveForm::getMaxAmplitude16(short* data, int count) {
-    const bool stereo = mChannelCount == 2;
-    const int64_t frames = (count <= 0 || data == nullptr) ? 0 : count / (stereo ? 2 : 1);
-    const uint8_t* p = reinterpret_cast<const uint8_t*>(data);
-    const int64_t frameBytes = stereo ? 4 : 2;
-    for (int64_t done = 0; done < frames;) {
-        const int64_t toClose = framesToClose();
-        const int64_t n = (toClose < 0) ? frames - done : std::min(toClose, frames - done);
-        if (stereo) {
-            int16_t l = mLeftPeak, r = mRightPeak;
-            peakStereo16(p, n, &l, &r);
-            if (l > mLeftPeak) mLeftPeak = l, mPeak = withHigh(mPeak, l >> 8);
-            if (r > mRightPeak) mRightPeak = r, mPeak = withLow(mPeak, r >> 8);
-        } else {
-            mPeak = peakMono16(p, n, mPeak);
-        }
-        p += n * frameBytes;
-        done += n;
-        if (n == toClose) {
-            closeInterval();
-        } else {
-            advanceCounter(n);
-        }
-    }
-    return mPeak;
+    return measure(reinterpret_cast<const uint8_t*>(data), count, 2);
 }
 
 int QNMediaAudioWaveForm::getMaxAmplitude24(signed char* data, int count) {
+    return measure(reinterpret_cast<const uint8_t*>(data), count, 3);
+}
+
+// Walks the frames in runs that end where an interval closes, so the per-frame
+// work is only the peak compare.
+int QNMediaAudioWaveForm::measure(const uint8_t* p, int count, int sampleBytes) {
     const bool stereo = mChannelCount == 2;
-    const int64_t frames = (count <= 0 || data == nullptr) ? 0 : count / (stereo ? 2 : 1);
-    const uint8_t* p = reinterpret_cast<const uint8_t*>(data);
-    const int64_t frameBytes = stereo ? 6 : 3;
+    const bool wide = sampleBytes == 2;  // 16-bit peaks give their high byte to a stereo value
+    const int64_t frames = (count <= 0 || p == nullptr) ? 0 : count / (stereo ? 2 : 1);
+    const int64_t frameBytes = sampleBytes * (stereo ? 2 : 1);
     for (int64_t done = 0; done < frames;) {
         const int64_t toClose = framesToClose();
         const int64_t n = (toClose < 0) ? frames - done : std::min(toClose, frames - done);
         if (stereo) {
             int16_t l = mLeftPeak, r = mRightPeak;
-            peakStereo24(p, n, &l, &r);
-            if (l > mLeftPeak) mLeftPeak = l, mPeak = withHigh(mPeak, l);
-            if (r > mRightPeak) mRightPeak = r, mPeak = withLow(mPeak, r);
+            (wide ? peakStereo16 : peakStereo24)(p, n, &l, &r);
+            if (l > mLeftPeak) mLeftPeak = l, mPeak = withHigh(mPeak, wide ? l >> 8 : l);
+            if (r > mRightPeak) mRightPeak = r, mPeak = withLow(mPeak, wide ? r >> 8 : r);
         } else {
-            mPeak = peakMono24(p, n, mPeak);
+            mPeak = (wide ? peakMono16 : peakMono24)(p, n, mPeak);
         }
         p += n * frameBytes;
         done += n;

@@ -42,6 +42,8 @@ private:
     // Counts n frames that do not close the interval.
     void advanceCounter(int64_t n);
     void closeInterval();
+    // Both peak functions: count samples of 2 or 3 bytes.
+    int measure(const uint8_t* p, int count, int sampleBytes);
 
     sp<AMessage> mFormat;
     bool mIsValid;

@@ -24,5 +24,6 @@ case "$mode" in
   *) echo "unknown mode $mode" >&2; exit 2 ;;
 esac
 cmake "${args[@]}" >/dev/null
-cmake --build "$work/build" -j"$(nproc)" >/dev/null
+# The public headers must compile cleanly in the consumer: any warning fails.
+cmake --build "$work/build" -j"$(nproc)" 2>&1 | { ! grep -E "warning|error"; }
 "$work/build/consumer"

@@ -9,21 +9,11 @@
 
 #include "LogCapture.h"
 #include "media/CodecSpecificData.h"
+#include "utils/UtilsTestHelpers.h"
 
 using namespace android;
 
 namespace {
-
-using Bytes = std::vector<uint8_t>;
-
-Bytes blob(const MetaDataBase& meta, uint32_t key) {
-    uint32_t type;
-    const void* data;
-    size_t size;
-    if (!meta.findData(key, &type, &data, &size)) return {};
-    const uint8_t* p = static_cast<const uint8_t*>(data);
-    return Bytes(p, p + size);
-}
 
 Bytes csd(const sp<AMessage>& msg, const char* name) {
     sp<ABuffer> b;
@@ -135,7 +125,7 @@ TEST(FormatConversionTest, AvcRecordBecomesAnnexBAndBack) {
 
     sp<MetaData> back = new MetaData;
     convertMessageToMetaData(msg, back);
-    EXPECT_EQ(record, blob(*back, kKeyAVCC));
+    EXPECT_EQ(record, blobOf(*back, kKeyAVCC));
 
     // Both kinds of parameter set in csd-0 alone give the same record.
     sp<AMessage> one = new AMessage;
@@ -143,7 +133,7 @@ TEST(FormatConversionTest, AvcRecordBecomesAnnexBAndBack) {
     setBuffer(one, "csd-0", annexB({&kSps, &kPps}));
     sp<MetaData> fromOne = new MetaData;
     convertMessageToMetaData(one, fromOne);
-    EXPECT_EQ(record, blob(*fromOne, kKeyAVCC));
+    EXPECT_EQ(record, blobOf(*fromOne, kKeyAVCC));
 }
 
 TEST(FormatConversionTest, HevcRecordIsBuiltFromTheSequenceParameterSet) {
@@ -152,7 +142,7 @@ TEST(FormatConversionTest, HevcRecordIsBuiltFromTheSequenceParameterSet) {
     setBuffer(msg, "csd-0", kHevcCsd);
     sp<MetaData> meta = new MetaData;
     convertMessageToMetaData(msg, meta);
-    const Bytes hvcc = blob(*meta, kKeyHVCC);
+    const Bytes hvcc = blobOf(*meta, kKeyHVCC);
     ASSERT_GE(hvcc.size(), 23u);
     EXPECT_EQ(1, hvcc[0]);
     EXPECT_EQ(0x01, hvcc[1]);   // Main profile, main tier
@@ -185,7 +175,7 @@ TEST(FormatConversionTest, EsdsCarriesTheDecoderSpecificInfo) {
     setBuffer(msg, "csd-0", asc);
     sp<MetaData> meta = new MetaData;
     convertMessageToMetaData(msg, meta);
-    const Bytes esds = blob(*meta, kKeyESDS);
+    const Bytes esds = blobOf(*meta, kKeyESDS);
     const Bytes expected = {0x03, 0x19, 0x00, 0x00, 0x00, 0x04, 0x11, 0x40, 0x15, 0x00, 0x00, 0x00, 0x00, 0x00,
                             0x00, 0x00, 0x00, 0x01, 0xF4, 0x00, 0x05, 0x02, 0x12, 0x10, 0x06, 0x01, 0x02};
     EXPECT_EQ(expected, esds);
@@ -213,7 +203,7 @@ TEST(FormatConversionTest, VorbisAndFlacHeadersAreCopied) {
     EXPECT_EQ(books, csd(msg, "csd-1"));
     sp<MetaData> back = new MetaData;
     convertMessageToMetaData(msg, back);
-    EXPECT_EQ(books, blob(*back, kKeyVorbisBooks));
+    EXPECT_EQ(books, blobOf(*back, kKeyVorbisBooks));
 
     const Bytes flac = {'f', 'L', 'a', 'C', 0x80, 0x00, 0x00, 0x22};
     sp<MetaData> f = new MetaData;
@@ -221,7 +211,7 @@ TEST(FormatConversionTest, VorbisAndFlacHeadersAreCopied) {
     f->setData(kKeyFlacMetadata, 0, flac.data(), flac.size());
     sp<MetaData> fback = new MetaData;
     convertMessageToMetaData(toMessage(f), fback);
-    EXPECT_EQ(flac, blob(*fback, kKeyFlacMetadata));
+    EXPECT_EQ(flac, blobOf(*fback, kKeyFlacMetadata));
 }
 
 TEST(FormatConversionTest, MalformedRecordsAreSkippedAndTheRestConverted) {

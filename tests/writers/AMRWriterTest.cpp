@@ -8,7 +8,6 @@
 #include "LogCapture.h"
 #include "amr/AMRFrames.h"
 #include "extractor/Sniffers.h"
-#include "extractors/AudioMediaFacts.h"
 #include "writers/AudioWriterTestSupport.h"
 
 using namespace android;
@@ -150,11 +149,7 @@ TEST(AMRWriterTest, TheAmrExtractorReadsBackEveryFrame) {
 
     sp<IMediaExtractor> extractor = CreateAMRExtractor(new FileSource(file.path().c_str()));
     ASSERT_NE(nullptr, extractor);
-    sp<IMediaSource> track = extractor->getTrack(0);
-    ASSERT_EQ(OK, track->start());
-    std::vector<audiotest::Sample> samples;
-    EXPECT_EQ(ERROR_END_OF_STREAM, audiotest::ReadSamples(track, &samples));
-    track->stop();
+    const std::vector<audiotest::Sample> samples = readTrack(extractor);
     EXPECT_EQ(60u, samples.size());
     EXPECT_TRUE(audiotest::Concat(samples) == frames);
 }

@@ -16,9 +16,13 @@
 #include <string>
 #include <vector>
 
+#include <media/IMediaExtractor.h>
 #include <media/stagefright/MediaAdapter.h>
 #include <media/stagefright/MediaBuffer.h>
 #include <media/stagefright/MetaData.h>
+
+#include "extractor/DeviceKeys.h"
+#include "extractors/AudioMediaFacts.h"
 
 namespace writertest {
 
@@ -121,6 +125,40 @@ inline Bytes tone16(int channels, int frames) {
         }
     }
     return out;
+}
+
+// What an extractor publishes of the device's items ("" / 0 when absent).
+struct PublishedItems {
+    Bytes waveform;
+    std::string userMessage, recMode;
+    int64_t bookmarkSize = 0;
+};
+
+inline PublishedItems publishedItems(const android::sp<android::IMediaExtractor>& extractor) {
+    PublishedItems items;
+    android::sp<android::MetaData> meta = extractor->getMetaData();
+    const void* data;
+    size_t size;
+    uint32_t type;
+    if (meta->findData(android::kKeyDeviceWaveForm, &type, &data, &size)) {
+        items.waveform.assign(static_cast<const uint8_t*>(data), static_cast<const uint8_t*>(data) + size);
+    }
+    const char* text;
+    if (meta->findCString(android::kKeyDeviceUserMessage, &text)) items.userMessage = text;
+    if (meta->findCString(android::kKeyDeviceRecMode, &text)) items.recMode = text;
+    extractor->getTrackMetaData(0)->findInt64(android::kKeyDeviceBookmarkSize, &items.bookmarkSize);
+    return items;
+}
+
+// Every sample of the extractor's first track, up to the end of the stream.
+inline std::vector<audiotest::Sample> readTrack(const android::sp<android::IMediaExtractor>& extractor) {
+    std::vector<audiotest::Sample> samples;
+    android::sp<android::IMediaSource> track = extractor->getTrack(0);
+    if (track == nullptr || track->start() != android::OK) return samples;
+    const android::status_t err = audiotest::ReadSamples(track, &samples);
+    track->stop();
+    if (err != android::ERROR_END_OF_STREAM) samples.clear();
+    return samples;
 }
 
 inline uint32_t le32(const uint8_t* p) { return p[0] | (p[1] << 8) | (p[2] << 16) | (uint32_t(p[3]) << 24); }

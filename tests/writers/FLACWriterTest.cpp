@@ -9,9 +9,7 @@
 
 #include "LogCapture.h"
 #include "QNMediaFlacFrameConverter.h"
-#include "extractor/DeviceKeys.h"
 #include "extractor/Sniffers.h"
-#include "extractors/AudioMediaFacts.h"
 #include "flac/FlacStreamHeader.h"
 #include "writers/AudioWriterTestSupport.h"
 
@@ -106,12 +104,8 @@ bool makeToolStream(int frames16Stereo, ToolStream* out) {
     out->header.assign(f.begin(), f.begin() + framesAt);
     sp<IMediaExtractor> extractor = CreateFLACExtractor(new FileSource(encoded.path().c_str()));
     if (extractor == nullptr || extractor->setOutputFormatFlag(5) != OK) return false;
-    sp<IMediaSource> track = extractor->getTrack(0);
-    std::vector<audiotest::Sample> samples;
-    if (track->start() != OK || audiotest::ReadSamples(track, &samples) != ERROR_END_OF_STREAM) return false;
-    track->stop();
-    for (audiotest::Sample& sample : samples) out->frames.push_back(std::move(sample.bytes));
-    return true;
+    for (audiotest::Sample& sample : readTrack(extractor)) out->frames.push_back(std::move(sample.bytes));
+    return !out->frames.empty();
 }
 
 }  // namespace
@@ -185,39 +179,20 @@ TEST(FLACWriterTest, TheFlacExtractorReadsItBackAndItsRawFramesCopyLosslessly) {
 
     sp<IMediaExtractor> extractor = CreateFLACExtractor(new FileSource(first.path().c_str()));
     ASSERT_NE(nullptr, extractor);
-    sp<MetaData> fileMeta = extractor->getMetaData();
-    const char* text;
-    ASSERT_TRUE(fileMeta->findCString(kKeyDeviceUserMessage, &text));
-    EXPECT_STREQ("message", text);
-    ASSERT_TRUE(fileMeta->findCString(kKeyDeviceRecMode, &text));
-    EXPECT_STREQ("vr", text);
-    const void* data;
-    size_t size;
-    uint32_t type;
-    ASSERT_TRUE(fileMeta->findData(kKeyDeviceWaveForm, &type, &data, &size));
-    EXPECT_EQ(Bytes(waveform, waveform + 4), Bytes(static_cast<const uint8_t*>(data), static_cast<const uint8_t*>(data) + size));
-    int64_t bookmark = 0;
-    EXPECT_TRUE(extractor->getTrackMetaData(0)->findInt64(kKeyDeviceBookmarkSize, &bookmark));
-    EXPECT_EQ(-2, bookmark);
-    sp<IMediaSource> track = extractor->getTrack(0);
-    ASSERT_EQ(OK, track->start());
-    std::vector<audiotest::Sample> samples;
-    EXPECT_EQ(ERROR_END_OF_STREAM, audiotest::ReadSamples(track, &samples));
-    track->stop();
-    EXPECT_TRUE(audiotest::Concat(samples) == pcm);
+    const PublishedItems items = publishedItems(extractor);
+    EXPECT_EQ("message", items.userMessage);
+    EXPECT_EQ("vr", items.recMode);
+    EXPECT_EQ(Bytes(waveform, waveform + 4), items.waveform);
+    EXPECT_EQ(-2, items.bookmarkSize);
+    EXPECT_TRUE(audiotest::Concat(readTrack(extractor)) == pcm);
 
     // The raw frames and their track format into a second writer.
     ASSERT_EQ(OK, extractor->setOutputFormatFlag(5));
-    track = extractor->getTrack(0);
     writer = new FLACWriter(copy.fd);
     source = makeSource(extractor->getTrackMetaData(0));
     ASSERT_EQ(OK, writer->addSource(source));
     ASSERT_EQ(OK, writer->start());
-    ASSERT_EQ(OK, track->start());
-    samples.clear();
-    EXPECT_EQ(ERROR_END_OF_STREAM, audiotest::ReadSamples(track, &samples));
-    track->stop();
-    for (const audiotest::Sample& s : samples) push(source, s.bytes, s.timeUs);
+    for (const audiotest::Sample& s : readTrack(extractor)) push(source, s.bytes, s.timeUs);
     ASSERT_EQ(OK, writer->stop());
     EXPECT_TRUE(flacTests(copy.path()));
     EXPECT_TRUE(flacDecode(copy.path()) == pcm);

@@ -11,9 +11,7 @@
 #include <media/stagefright/QNWAVEWriter.h>
 
 #include "LogCapture.h"
-#include "extractor/DeviceKeys.h"
 #include "extractor/Sniffers.h"
-#include "extractors/AudioMediaFacts.h"
 #include "writers/AudioWriterTestSupport.h"
 #include "writers/WaveChunks.h"
 
@@ -111,26 +109,12 @@ TEST(WAVEWriterTest, Pcm16StereoWithItemsReadsBackThroughFfmpegAndTheExtractor) 
 
     sp<IMediaExtractor> extractor = CreateWAVExtractor(new FileSource(file.path().c_str()));
     ASSERT_NE(nullptr, extractor);
-    sp<MetaData> fileMeta = extractor->getMetaData();
-    const void* data;
-    size_t size;
-    uint32_t type;
-    ASSERT_TRUE(fileMeta->findData(kKeyDeviceWaveForm, &type, &data, &size));
-    EXPECT_EQ(Bytes(waveform, waveform + 6), Bytes(static_cast<const uint8_t*>(data), static_cast<const uint8_t*>(data) + size));
-    const char* text;
-    ASSERT_TRUE(fileMeta->findCString(kKeyDeviceUserMessage, &text));
-    EXPECT_STREQ("hello there", text);
-    ASSERT_TRUE(fileMeta->findCString(kKeyDeviceRecMode, &text));
-    EXPECT_STREQ("vr:1", text);
-    int64_t bookmark = 0;
-    EXPECT_TRUE(extractor->getTrackMetaData(0)->findInt64(kKeyDeviceBookmarkSize, &bookmark));
-    EXPECT_EQ(123456789012LL, bookmark);
-    sp<IMediaSource> track = extractor->getTrack(0);
-    ASSERT_EQ(OK, track->start());
-    std::vector<audiotest::Sample> samples;
-    EXPECT_EQ(ERROR_END_OF_STREAM, audiotest::ReadSamples(track, &samples));
-    track->stop();
-    EXPECT_TRUE(audiotest::Concat(samples) == pcm);
+    const PublishedItems items = publishedItems(extractor);
+    EXPECT_EQ(Bytes(waveform, waveform + 6), items.waveform);
+    EXPECT_EQ("hello there", items.userMessage);
+    EXPECT_EQ("vr:1", items.recMode);
+    EXPECT_EQ(123456789012LL, items.bookmarkSize);
+    EXPECT_TRUE(audiotest::Concat(readTrack(extractor)) == pcm);
 
     if (!haveTool("ffprobe") || !haveTool("ffmpeg")) GTEST_SKIP() << "ffmpeg tools missing";
     EXPECT_EQ("codec_name=pcm_s16le\nsample_rate=44100\nchannels=2\n",

@@ -15,7 +15,7 @@
 #include "mpeg4/Mp4BoxWriter.h"
 #include "mpeg4/Mp4DeviceItems.h"
 #include "mpeg4/Mp4MovieBoxes.h"
-#include "mpeg4/Mp4Track.h"
+#include "mpeg4/Mp4TrackWriter.h"
 
 namespace android {
 
@@ -25,7 +25,7 @@ struct MPEG4Writer::Impl {
 
     struct Slot {
         sp<MediaSource> source;
-        std::unique_ptr<Mp4Track> track;
+        std::unique_ptr<Mp4TrackWriter> track;
         std::thread reader;
     };
     enum class State { kIdle, kStarted, kFailed, kStopped };
@@ -137,7 +137,7 @@ void MPEG4Writer::Impl::readLoop(size_t index) {
             if (err != ERROR_END_OF_STREAM) ALOGW("track %zu ends on read status %d", index, err);
             break;
         }
-        Mp4Track::Sample sample;
+        Mp4TrackWriter::Sample sample;
         if (slot.track->prepare(buffer, &sample)) {
             std::lock_guard<std::mutex> guard(lock);
             // After a write error the source is still drained, so that its
@@ -187,7 +187,7 @@ status_t MPEG4Writer::Impl::finishFile() {
     if (sink->writeAt(mdatStart, mdatHeader.data(), mdatHeader.size()) != OK) return ERROR_IO;
 
     status_t trackError = OK;
-    std::vector<const Mp4Track*> finished;
+    std::vector<const Mp4TrackWriter*> finished;
     for (size_t i = 0; i < slots.size(); ++i) {
         const status_t err = slots[i]->track->finish();
         if (err == OK) {
@@ -233,7 +233,7 @@ status_t MPEG4Writer::addSource(const sp<MediaSource>& source) {
     if (source == nullptr) return BAD_VALUE;
     const status_t err = mImpl->checkIdle("addSource()");
     if (err != OK) return err;
-    std::unique_ptr<Mp4Track> track = Mp4Track::Create(source->getFormat());
+    std::unique_ptr<Mp4TrackWriter> track = Mp4TrackWriter::Create(source->getFormat());
     if (track == nullptr) return ERROR_UNSUPPORTED;
     if (mImpl->m4a && track->isVideo()) {
         ALOGE("an M4A file holds audio only");

@@ -5,7 +5,7 @@
 
 #include "mpeg4/Mp4BoxWriter.h"
 #include "mpeg4/Mp4DeviceItems.h"
-#include "mpeg4/Mp4Track.h"
+#include "mpeg4/Mp4TrackWriter.h"
 
 namespace android {
 
@@ -19,10 +19,10 @@ void Mp4WriteFileType(Mp4BoxWriter& w, bool m4a) {
     w.endBox();
 }
 
-uint32_t Mp4ChooseMovieTimescale(const std::vector<const Mp4Track*>& tracks) {
+uint32_t Mp4ChooseMovieTimescale(const std::vector<const Mp4TrackWriter*>& tracks) {
     for (uint32_t ts : {1000u, 90000u, 1000000u}) {
         bool exact = true;
-        for (const Mp4Track* t : tracks) {
+        for (const Mp4TrackWriter* t : tracks) {
             const int64_t start = t->timing().startUs;
             exact = exact && Mp4TicksToUs(Mp4UsToTicks(start, ts), ts) == start;
         }
@@ -31,14 +31,14 @@ uint32_t Mp4ChooseMovieTimescale(const std::vector<const Mp4Track*>& tracks) {
     return 1000000;
 }
 
-void Mp4WriteMovie(Mp4BoxWriter& w, const std::vector<const Mp4Track*>& tracks, const Mp4DeviceItems& items,
+void Mp4WriteMovie(Mp4BoxWriter& w, const std::vector<const Mp4TrackWriter*>& tracks, const Mp4DeviceItems& items,
                    const WriterDeviceItems::Snapshot& shared, int32_t rotation) {
     // Seconds since 1904-01-01, as the movie header counts them.
     const uint64_t now = static_cast<uint64_t>(time(nullptr)) + 2082844800ULL;
     const uint32_t created = now > UINT32_MAX ? 0 : static_cast<uint32_t>(now);
     const uint32_t timescale = Mp4ChooseMovieTimescale(tracks);
     uint64_t duration = 0;
-    for (const Mp4Track* t : tracks) {
+    for (const Mp4TrackWriter* t : tracks) {
         const uint64_t d = t->timing().presentedDuration(timescale);
         if (d > duration) duration = d;
     }

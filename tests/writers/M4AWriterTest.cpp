@@ -4,7 +4,9 @@
 #include <unistd.h>
 
 #include <gtest/gtest.h>
+#include <media/stagefright/FileSource.h>
 #include <media/stagefright/MediaAdapter.h>
+#include <media/stagefright/MediaExtractorFactory.h>
 #include <media/stagefright/MediaDefs.h>
 #include <media/stagefright/MediaErrors.h>
 #include <media/stagefright/QNM4AWriter.h>
@@ -72,6 +74,17 @@ TEST_F(M4AWriterTest, StoresItemsUnderItsBrand) {
     EXPECT_EQ(std::vector<uint8_t>({'v', 'r', '-', 'm', 'o', 'd', 'e'}), udta.at("rmod"));
     EXPECT_EQ(std::vector<uint8_t>({0, 0, 0, 0, 0, 0, 0, 77}), udta.at("bksz"));
     EXPECT_EQ(std::vector<uint8_t>(wave, wave + 6), udta.at("wafm"));
+    sp<IMediaExtractor> extractor = MediaExtractorFactory::Create(new FileSource(mPath.c_str()));
+    ASSERT_NE(nullptr, extractor);
+    sp<MetaData> meta = extractor->getMetaData();
+    const char* text = nullptr;
+    ASSERT_TRUE(meta->findCString('umsg', &text));
+    EXPECT_STREQ("hello", text);
+    ASSERT_TRUE(meta->findCString('rmod', &text));
+    EXPECT_STREQ("vr-mode", text);
+    int64_t bookmark = 0;
+    ASSERT_TRUE(extractor->getTrackMetaData(0)->findInt64('bkSz', &bookmark));
+    EXPECT_EQ(77, bookmark);
     if (real) {
         std::string errors;
         EXPECT_TRUE(decodesCleanly(mPath, &errors)) << errors;
@@ -94,6 +107,12 @@ TEST_F(M4AWriterTest, LargeBookmarkAndRefusals) {
     const auto udta = childBoxes(readFile(mPath), "moov/udta");
     EXPECT_EQ(std::vector<uint8_t>({0, 0, 0, 0x12, 0x34, 0x56, 0x78, 0x9A}), udta.at("bksz"));
     EXPECT_EQ(0u, udta.count("umsg"));
+    // The bookmark size comes back with the audio track.
+    sp<IMediaExtractor> extractor = MediaExtractorFactory::Create(new FileSource(mPath.c_str()));
+    ASSERT_NE(nullptr, extractor);
+    int64_t bookmark = 0;
+    ASSERT_TRUE(extractor->getTrackMetaData(0)->findInt64('bkSz', &bookmark));
+    EXPECT_EQ(INT64_C(0x123456789A), bookmark);
 }
 
 }  // namespace

@@ -5,7 +5,9 @@
 #include <unistd.h>
 
 #include <gtest/gtest.h>
+#include <media/stagefright/FileSource.h>
 #include <media/stagefright/MPEG4Writer.h>
+#include <media/stagefright/MediaExtractorFactory.h>
 #include <media/stagefright/MediaAdapter.h>
 #include <media/stagefright/MediaDefs.h>
 #include <media/stagefright/MediaErrors.h>
@@ -252,6 +254,27 @@ TEST_F(MPEG4WriterFileTest, DeviceItemsStored) {
     EXPECT_EQ(uuid, top.at("uuid"));
     std::string errors;
     EXPECT_TRUE(decodesCleanly(out, &errors)) << errors;
+
+    // Our extractor publishes what was set.
+    sp<IMediaExtractor> extractor = MediaExtractorFactory::Create(new FileSource(out.c_str()));
+    ASSERT_NE(nullptr, extractor);
+    ASSERT_EQ(2u, extractor->countTracks());
+    sp<MetaData> meta = extractor->getMetaData();
+    const char* text = nullptr;
+    ASSERT_TRUE(meta->findCString(kKeyLocation, &text));
+    EXPECT_STREQ("-33.5000+151.2099/", text);
+    ASSERT_TRUE(meta->findCString('vrty', &text));
+    EXPECT_STREQ("slow", text);
+    uint32_t type = 0;
+    const void* data = nullptr;
+    size_t size = 0;
+    ASSERT_TRUE(meta->findData('svdt', &type, &data, &size));
+    // One zero byte behind the payload, which readers drop.
+    ASSERT_EQ(sizeof(sphere) + 1, size);
+    EXPECT_EQ(0, memcmp(sphere, data, sizeof(sphere)));
+    ASSERT_TRUE(meta->findData('wafm', &type, &data, &size));
+    EXPECT_EQ(std::vector<uint8_t>(wave, wave + 4),
+              std::vector<uint8_t>(static_cast<const uint8_t*>(data), static_cast<const uint8_t*>(data) + size));
 }
 
 }  // namespace

@@ -1,5 +1,5 @@
 #define LOG_TAG "MPEG4Writer"
-#include "mpeg4/Mp4Track.h"
+#include "mpeg4/Mp4TrackWriter.h"
 
 #include <cstring>
 
@@ -20,8 +20,8 @@ constexpr size_t kMaxParameterSets = 32;
 enum { kVps = 0, kSps = 1, kPps = 2 };
 
 // Which parameter-set list a NAL unit belongs to, or -1.
-int parameterSetKind(Mp4Track::Codec codec, const NalSpan& nal) {
-    if (codec == Mp4Track::Codec::kAvc) {
+int parameterSetKind(Mp4TrackWriter::Codec codec, const NalSpan& nal) {
+    if (codec == Mp4TrackWriter::Codec::kAvc) {
         const int type = nal.data[0] & 0x1F;
         return type == 7 ? kSps : type == 8 ? kPps : -1;
     }
@@ -35,13 +35,13 @@ std::vector<NalSpan> spans(const std::vector<std::vector<uint8_t>>& units) {
     return out;
 }
 
-size_t recordLengthSize(Mp4Track::Codec codec, const uint8_t* data, size_t size) {
-    return codec == Mp4Track::Codec::kAvc ? Mp4AvcCLengthSize(data, size) : Mp4HvcCLengthSize(data, size);
+size_t recordLengthSize(Mp4TrackWriter::Codec codec, const uint8_t* data, size_t size) {
+    return codec == Mp4TrackWriter::Codec::kAvc ? Mp4AvcCLengthSize(data, size) : Mp4HvcCLengthSize(data, size);
 }
 
 }  // namespace
 
-std::unique_ptr<Mp4Track> Mp4Track::Create(const sp<MetaData>& format) {
+std::unique_ptr<Mp4TrackWriter> Mp4TrackWriter::Create(const sp<MetaData>& format) {
     const char* mime = nullptr;
     if (format == nullptr || !format->findCString(kKeyMIMEType, &mime) || mime == nullptr) {
         ALOGE("track format without a MIME type");
@@ -62,10 +62,10 @@ std::unique_ptr<Mp4Track> Mp4Track::Create(const sp<MetaData>& format) {
         ALOGE("cannot store %s in an MP4 file", mime);
         return nullptr;
     }
-    return std::unique_ptr<Mp4Track>(new Mp4Track(codec, format));
+    return std::unique_ptr<Mp4TrackWriter>(new Mp4TrackWriter(codec, format));
 }
 
-Mp4Track::Mp4Track(Codec codec, const sp<MetaData>& format) : mCodec(codec) {
+Mp4TrackWriter::Mp4TrackWriter(Codec codec, const sp<MetaData>& format) : mCodec(codec) {
     format->findInt32(kKeyWidth, &mWidth);
     format->findInt32(kKeyHeight, &mHeight);
     format->findInt32(kKeyFrameRate, &mFrameRate);
@@ -108,7 +108,7 @@ Mp4Track::Mp4Track(Codec codec, const sp<MetaData>& format) : mCodec(codec) {
     }
 }
 
-void Mp4Track::collectParameterSets(const std::vector<NalSpan>& nals) {
+void Mp4TrackWriter::collectParameterSets(const std::vector<NalSpan>& nals) {
     for (const NalSpan& nal : nals) {
         const int kind = parameterSetKind(mCodec, nal);
         if (kind < 0) continue;
@@ -119,7 +119,7 @@ void Mp4Track::collectParameterSets(const std::vector<NalSpan>& nals) {
     }
 }
 
-void Mp4Track::takeConfigBuffer(const uint8_t* data, size_t size) {
+void Mp4TrackWriter::takeConfigBuffer(const uint8_t* data, size_t size) {
     if (mCodec == Codec::kAac) {
         if (!mRecord.empty()) return;
         const uint8_t* asc = nullptr;
@@ -156,7 +156,7 @@ void Mp4Track::takeConfigBuffer(const uint8_t* data, size_t size) {
     }
 }
 
-const uint8_t* Mp4Track::toLengthPrefixed(const uint8_t* data, size_t size, size_t* outSize) {
+const uint8_t* Mp4TrackWriter::toLengthPrefixed(const uint8_t* data, size_t size, size_t* outSize) {
     *outSize = size;
     if (Mp4IsLengthPrefixed(data, size, mLengthSize)) return data;
     if (!Mp4SplitAnnexB(data, size, &mNals)) {
@@ -174,7 +174,7 @@ const uint8_t* Mp4Track::toLengthPrefixed(const uint8_t* data, size_t size, size
     return mScratch.data();
 }
 
-bool Mp4Track::prepare(MediaBufferBase* buffer, Sample* out) {
+bool Mp4TrackWriter::prepare(MediaBufferBase* buffer, Sample* out) {
     const uint8_t* data = static_cast<const uint8_t*>(buffer->data()) + buffer->range_offset();
     const size_t size = buffer->range_length();
     MetaDataBase& meta = buffer->meta_data();
@@ -211,11 +211,11 @@ bool Mp4Track::prepare(MediaBufferBase* buffer, Sample* out) {
     return true;
 }
 
-void Mp4Track::record(const Sample& s, uint64_t offset, bool continuesChunk) {
+void Mp4TrackWriter::record(const Sample& s, uint64_t offset, bool continuesChunk) {
     mTables.addSample(offset, static_cast<uint32_t>(s.size), s.dtsUs, s.ptsUs, s.sync, continuesChunk);
 }
 
-std::vector<uint8_t> Mp4Track::buildConfig() const {
+std::vector<uint8_t> Mp4TrackWriter::buildConfig() const {
     if (!mRecord.empty()) return mRecord;
     switch (mCodec) {
         case Codec::kAvc:
@@ -231,7 +231,7 @@ std::vector<uint8_t> Mp4Track::buildConfig() const {
     }
 }
 
-int64_t Mp4Track::defaultDurationUs() const {
+int64_t Mp4TrackWriter::defaultDurationUs() const {
     switch (mCodec) {
         case Codec::kAac:
             return mSampleRate ? 1024 * 1000000LL / mSampleRate : 23220;
@@ -243,7 +243,7 @@ int64_t Mp4Track::defaultDurationUs() const {
     }
 }
 
-status_t Mp4Track::finish() {
+status_t Mp4TrackWriter::finish() {
     if (mTables.sampleCount() == 0) return ERROR_END_OF_STREAM;
     if (mCodec == Codec::kAvc || mCodec == Codec::kHevc || mCodec == Codec::kAac) {
         mFinalConfig = buildConfig();
@@ -268,7 +268,7 @@ status_t Mp4Track::finish() {
     return err;
 }
 
-void Mp4Track::writeSampleEntry(Mp4BoxWriter& w) const {
+void Mp4TrackWriter::writeSampleEntry(Mp4BoxWriter& w) const {
     switch (mCodec) {
         case Codec::kAvc:
         case Codec::kHevc: {
@@ -309,7 +309,7 @@ void writeMatrix(Mp4BoxWriter& w, int32_t rotation) {
 
 }  // namespace
 
-void Mp4Track::writeTrak(Mp4BoxWriter& w, uint32_t trackId, uint32_t movieTimescale, int32_t rotation,
+void Mp4TrackWriter::writeTrak(Mp4BoxWriter& w, uint32_t trackId, uint32_t movieTimescale, int32_t rotation,
                          uint32_t creationTime) const {
     const uint64_t duration = mTiming.presentedDuration(movieTimescale);
     const bool wideTrack = duration > UINT32_MAX;

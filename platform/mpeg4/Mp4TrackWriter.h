@@ -1,5 +1,5 @@
-#ifndef MP4_TRACK_H_
-#define MP4_TRACK_H_
+#ifndef MP4_TRACK_WRITER_H_
+#define MP4_TRACK_WRITER_H_
 
 #include <cstdint>
 #include <memory>
@@ -23,12 +23,12 @@ class Mp4BoxWriter;
 //
 // prepare() runs on the track's reader thread only; record() under the
 // writer's file lock; finish() and writeTrak() after the reader has ended.
-class Mp4Track {
+class Mp4TrackWriter {
 public:
     enum class Codec { kAvc, kHevc, kAac, kAmrNb, kAmrWb };
 
     // Null, with a log line, for a format this writer cannot store.
-    static std::unique_ptr<Mp4Track> Create(const sp<MetaData>& format);
+    static std::unique_ptr<Mp4TrackWriter> Create(const sp<MetaData>& format);
 
     bool isVideo() const { return mCodec == Codec::kAvc || mCodec == Codec::kHevc; }
     Codec codec() const { return mCodec; }
@@ -55,7 +55,7 @@ public:
     const Mp4TrackTiming& timing() const { return mTiming; }
 
 private:
-    explicit Mp4Track(Codec codec, const sp<MetaData>& format);
+    explicit Mp4TrackWriter(Codec codec, const sp<MetaData>& format);
 
     void takeConfigBuffer(const uint8_t* data, size_t size);
     void collectParameterSets(const std::vector<NalSpan>& nals);

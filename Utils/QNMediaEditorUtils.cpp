@@ -106,6 +106,7 @@ sp<ABuffer> QNMediaEditorUtils::FindNAL(const uint8_t* data, size_t size, unsign
         // An empty unit has no header byte to test.
         if (unitSize > 0 && (unit[0] & 0x1F) == type) {
             sp<ABuffer> buffer = new ABuffer(unitSize);
+            if (buffer->base() == nullptr) return nullptr;  // no memory behind it
             memcpy(buffer->data(), unit, unitSize);
             return buffer;
         }

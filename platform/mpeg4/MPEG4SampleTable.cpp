@@ -25,6 +25,20 @@ bool ReadTableHeader(ByteReader* r, uint32_t* count, uint64_t entryBytes) {
     return r->has(uint64_t(*count) * entryBytes);
 }
 
+// Calls `each` with the fields of every entry of a table of kFields 32-bit
+// fields; `each` answers false for an entry that cannot be right.
+template <size_t kFields, typename Each>
+bool ForEachEntry(ByteReader r, Each each) {
+    uint32_t count;
+    if (!ReadTableHeader(&r, &count, 4 * kFields)) return false;
+    for (uint32_t i = 0; i < count; ++i) {
+        uint32_t fields[kFields] = {};
+        for (uint32_t& f : fields) r.be32(&f);
+        if (!each(fields)) return false;
+    }
+    return true;
+}
+
 status_t Malformed(const char* what) {
     ALOGW("malformed sample table: %s", what);
     return ERROR_MALFORMED;
@@ -63,61 +77,45 @@ status_t SampleTable::setChunkOffsets(uint32_t type, ByteReader r) {
 }
 
 status_t SampleTable::setSampleToChunk(ByteReader r) {
-    uint32_t count;
-    if (!ReadTableHeader(&r, &count, 12)) return Malformed("more sample-to-chunk entries than the box holds");
-    mChunkRuns.reserve(count);
     uint32_t previous = 0;
-    for (uint32_t i = 0; i < count; ++i) {
-        uint32_t firstChunk = 0, perChunk = 0, description = 0;
-        r.be32(&firstChunk);
-        r.be32(&perChunk);
-        r.be32(&description);
-        if (firstChunk <= previous) return Malformed("sample-to-chunk entries out of order");
-        previous = firstChunk;
-        mChunkRuns.push_back({0, firstChunk - 1, 0, perChunk});
-    }
+    const bool ok = ForEachEntry<3>(r, [&](const uint32_t* e) {
+        // First chunk numbers start at 1 and rise.
+        if (e[0] <= previous) return false;
+        previous = e[0];
+        mChunkRuns.push_back({0, e[0] - 1, 0, e[1]});
+        return true;
+    });
+    if (!ok) return Malformed("sample-to-chunk entries that do not fit or are out of order");
     mHaveSampleToChunk = true;
     return OK;
 }
 
 status_t SampleTable::setTimeToSample(ByteReader r) {
-    uint32_t count;
-    if (!ReadTableHeader(&r, &count, 8)) return Malformed("more time-to-sample entries than the box holds");
-    mTimeRuns.reserve(count);
-    for (uint32_t i = 0; i < count; ++i) {
-        uint32_t samples = 0, delta = 0;
-        r.be32(&samples);
-        r.be32(&delta);
-        if (samples > 0) mTimeRuns.push_back({0, 0, samples, delta});
-    }
+    const bool ok = ForEachEntry<2>(r, [&](const uint32_t* e) {
+        if (e[0] > 0) mTimeRuns.push_back({0, 0, e[0], e[1]});
+        return true;
+    });
+    if (!ok) return Malformed("more time-to-sample entries than the box holds");
     mHaveTimes = true;
     return OK;
 }
 
 status_t SampleTable::setCompositionOffsets(ByteReader r) {
-    uint32_t count;
-    if (!ReadTableHeader(&r, &count, 8)) return Malformed("more composition offsets than the box holds");
-    mOffsetRuns.reserve(count);
-    for (uint32_t i = 0; i < count; ++i) {
-        uint32_t samples = 0, offset = 0;
-        r.be32(&samples);
-        r.be32(&offset);
-        // Version 0 declares the offsets unsigned, but writers store negative
-        // ones there too; an offset of 2^31 ticks or more is never meant.
-        if (samples > 0) mOffsetRuns.push_back({0, samples, static_cast<int32_t>(offset)});
-    }
-    return OK;
+    // Version 0 declares the offsets unsigned, but writers store negative
+    // ones there too; an offset of 2^31 ticks or more is never meant.
+    const bool ok = ForEachEntry<2>(r, [&](const uint32_t* e) {
+        if (e[0] > 0) mOffsetRuns.push_back({0, e[0], static_cast<int32_t>(e[1])});
+        return true;
+    });
+    return ok ? OK : Malformed("more composition offsets than the box holds");
 }
 
 status_t SampleTable::setSyncSamples(ByteReader r) {
-    uint32_t count;
-    if (!ReadTableHeader(&r, &count, 4)) return Malformed("more sync samples than the box holds");
-    mSyncSamples.reserve(count);
-    for (uint32_t i = 0; i < count; ++i) {
-        uint32_t number = 0;
-        r.be32(&number);
-        if (number > 0) mSyncSamples.push_back(number - 1);
-    }
+    const bool ok = ForEachEntry<1>(r, [&](const uint32_t* e) {
+        if (e[0] > 0) mSyncSamples.push_back(e[0] - 1);
+        return true;
+    });
+    if (!ok) return Malformed("more sync samples than the box holds");
     mHaveSyncTable = true;
     return OK;
 }

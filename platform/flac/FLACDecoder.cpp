@@ -103,9 +103,11 @@ FLAC__StreamDecoderWriteStatus FLACDecoder::write(const FLAC__Frame* frame, cons
     dropPending();
     const uint32_t channels = frame->header.channels;
     const uint32_t blockSize = frame->header.blocksize;
-    if (channels != mInfo.channels || frame->header.bits_per_sample != mInfo.bitsPerSample) {
-        ALOGW("frame of %u channels, %u bits in a stream of %u, %u", channels, frame->header.bits_per_sample,
-              mInfo.channels, mInfo.bitsPerSample);
+    // Buffers are sized from STREAMINFO; a frame that disagrees is damage.
+    if (channels != mInfo.channels || frame->header.bits_per_sample != mInfo.bitsPerSample ||
+        blockSize > mInfo.maxBlockSize) {
+        ALOGW("frame of %u samples, %u channels, %u bits in a stream of %u, %u, %u", blockSize, channels,
+              frame->header.bits_per_sample, mInfo.maxBlockSize, mInfo.channels, mInfo.bitsPerSample);
         mFrameDamaged = true;
         return FLAC__STREAM_DECODER_WRITE_STATUS_CONTINUE;
     }

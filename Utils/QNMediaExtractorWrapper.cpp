@@ -288,8 +288,12 @@ status_t QNMediaExtractorWrapper::selectTrack(size_t index) {
     info.mTrackFlags = 0;
     mSelectedTracks.push(info);
 
-    const char* mime;
-    CHECK(source->getFormat()->findCString(kKeyMIMEType, &mime));
+    // The format is held while `mime`, which points into it, is compared.
+    sp<MetaData> trackFormat = source->getFormat();
+    const char* mime = nullptr;
+    LOG_ALWAYS_FATAL_IF(trackFormat == nullptr || !trackFormat->findCString(kKeyMIMEType, &mime), "%s",
+                        __FILE__ ":" LITERAL_TO_STRING(__LINE__)
+                        " CHECK(source->getFormat()->findCString(kKeyMIMEType, &mime)) failed.");
     if (!strcasecmp(mime, MEDIA_MIMETYPE_AUDIO_VORBIS)) {
         mSelectedTracks.editTop().mTrackFlags |= kIsVorbis;
     }

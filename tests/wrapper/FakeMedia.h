@@ -59,7 +59,8 @@ public:
     }
     status_t start(MetaData*) override { ++starts; return startResult; }
     status_t stop() override { ++stops; return stopResult; }
-    sp<MetaData> getFormat() override { return mFormat; }
+    // A fresh copy each time, as sources in another process hand out.
+    sp<MetaData> getFormat() override { return new MetaData(*mFormat); }
     status_t read(MediaBufferBase** out, const ReadOptions* options) override {
         *out = nullptr;
         ++reads;

@@ -54,13 +54,13 @@ inline Step failure(status_t status) {
 class FakeSource : public MediaSource {
 public:
     FakeSource(const char* mime, std::vector<Step> steps, BufferLedger* ledger)
-        : mFormat(new MetaData), mSteps(std::move(steps)), mLedger(ledger) {
-        mFormat->setCString(kKeyMIMEType, mime);
+        : format(new MetaData), mSteps(std::move(steps)), mLedger(ledger) {
+        format->setCString(kKeyMIMEType, mime);
     }
     status_t start(MetaData*) override { ++starts; return startResult; }
     status_t stop() override { ++stops; return stopResult; }
     // A fresh copy each time, as sources in another process hand out.
-    sp<MetaData> getFormat() override { return new MetaData(*mFormat); }
+    sp<MetaData> getFormat() override { return new MetaData(*format); }
     status_t read(MediaBufferBase** out, const ReadOptions* options) override {
         *out = nullptr;
         ++reads;
@@ -92,9 +92,9 @@ public:
     int starts = 0, stops = 0, reads = 0, readsWithoutOptions = 0;
     std::vector<int64_t> seeks;
     ReadOptions::SeekMode lastSeekMode = ReadOptions::SEEK_CLOSEST_SYNC;
+    sp<MetaData> format;
 
 private:
-    sp<MetaData> mFormat;
     std::vector<Step> mSteps;
     size_t mPos = 0;
     BufferLedger* mLedger;

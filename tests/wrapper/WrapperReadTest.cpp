@@ -101,6 +101,13 @@ TEST_F(WrapperReadTest, SourceThatFailsToStartIsNotSelected) {
     EXPECT_EQ(0, s->stops);
 }
 
+TEST_F(WrapperReadTest, SourceFormatWithoutMimeTypeIsABrokenContract) {
+    GTEST_FLAG_SET(death_test_style, "threadsafe");
+    addTrack("audio/raw", {})->format->remove(kKeyMIMEType);
+    open();
+    EXPECT_DEATH(wrapper->selectTrack(0), "CHECK\\(source->getFormat\\(\\)->findCString\\(kKeyMIMEType, &mime\\)\\) failed\\.");
+}
+
 TEST_F(WrapperReadTest, SeekRevivesEndedTracksAndPassesModeOnce) {
     sp<FakeSource> s = addTrack("video/avc", samplesAt({0, 40, 80}));
     open();

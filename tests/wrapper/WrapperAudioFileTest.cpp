@@ -1,0 +1,138 @@
+#include <gtest/gtest.h>
+
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include "QNMediaEditorDefs.h"
+#include "QNMediaExtractorWrapper.h"
+#include "extractors/AudioMediaFacts.h"
+
+using namespace android;
+using namespace android::qnmediaeditor;
+using namespace audiotest;
+
+namespace {
+
+sp<QNMediaExtractorWrapper> OpenWrapper(const std::string& name) {
+    const int fd = open(MediaPath(name).c_str(), O_RDONLY);
+    struct stat st;
+    if (fd < 0 || fstat(fd, &st) != 0) return nullptr;
+    sp<QNMediaExtractorWrapper> wrapper = new QNMediaExtractorWrapper;
+    const status_t err = wrapper->setDataSource(fd, 0, st.st_size);
+    close(fd);  // the wrapper keeps its own
+    return err == OK ? wrapper : nullptr;
+}
+
+struct Delivered {
+    size_t track;
+    int64_t timeUs;
+    std::vector<uint8_t> bytes;
+};
+
+std::vector<Delivered> ReadAll(const sp<QNMediaExtractorWrapper>& wrapper) {
+    std::vector<Delivered> out;
+    Delivered d;
+    sp<ABuffer> buffer;
+    while (wrapper->getSampleTrackIndex(&d.track) == OK) {
+        EXPECT_EQ(OK, wrapper->getSampleTime(&d.timeUs));
+        EXPECT_EQ(OK, wrapper->readSampleData(&buffer));
+        d.bytes.assign(buffer->data(), buffer->data() + buffer->size());
+        out.push_back(d);
+        EXPECT_EQ(OK, wrapper->advance());
+    }
+    return out;
+}
+
+std::vector<uint8_t> Concat(const std::vector<Delivered>& samples) {
+    std::vector<uint8_t> all;
+    for (const Delivered& s : samples) all.insert(all.end(), s.bytes.begin(), s.bytes.end());
+    return all;
+}
+
+}  // namespace
+
+TEST(WrapperAudioFileTest, PcmFilesReadBackWholeAndInOrder) {
+    for (const char* name : {"u8_mono.wav", "s16_stereo.wav", "s24_mono.wav", "s24_ext_6ch.wav", "s32_stereo.wav",
+                             "f32_mono.wav"}) {
+        SCOPED_TRACE(name);
+        sp<QNMediaExtractorWrapper> wrapper = OpenWrapper(name);
+        ASSERT_NE(nullptr, wrapper);
+        ASSERT_EQ(1u, wrapper->countTracks());
+        ASSERT_EQ(OK, wrapper->selectTrack(0));
+        const std::vector<Delivered> samples = ReadAll(wrapper);
+        ASSERT_FALSE(samples.empty());
+        EXPECT_EQ(0, samples[0].timeUs);
+        for (size_t i = 1; i < samples.size(); ++i) EXPECT_LT(samples[i - 1].timeUs, samples[i].timeUs);
+        // No format asked, so no track is re-packed.
+        const std::vector<uint8_t> pcm = Concat(samples);
+        EXPECT_EQ(Fact(name, "pcm_fnv"), Hex64(Fnv(pcm)));
+        EXPECT_EQ(static_cast<size_t>(FactInt(name, "frames") * FactInt(name, "channels") * FactInt(name, "bits") / 8),
+                  pcm.size());
+        EXPECT_EQ(ERROR_END_OF_STREAM, wrapper->advance());
+        ASSERT_EQ(OK, wrapper->seekTo(0));
+        EXPECT_EQ(pcm, Concat(ReadAll(wrapper)));
+    }
+}
+
+TEST(WrapperAudioFileTest, ThirtyTwoBitTracksArePackedOnceTheirFormatIsAsked) {
+    sp<QNMediaExtractorWrapper> plain = OpenWrapper("s32_stereo.wav");
+    sp<QNMediaExtractorWrapper> packed = OpenWrapper("s32_stereo.wav");
+    ASSERT_NE(nullptr, plain);
+    ASSERT_NE(nullptr, packed);
+    sp<AMessage> format;
+    ASSERT_EQ(OK, packed->getTrackFormat(0, &format));
+    int32_t encoding = 0, bits = 0;
+    EXPECT_TRUE(format->findInt32("pcm-encoding", &encoding));
+    EXPECT_EQ(kEditorAudioEncodingPcm24bitPacked, encoding);
+    EXPECT_TRUE(format->findInt32("bits-per-sample", &bits));
+    EXPECT_EQ(24, bits);
+    ASSERT_EQ(OK, plain->selectTrack(0));
+    ASSERT_EQ(OK, packed->selectTrack(0));
+    const std::vector<uint8_t> words = Concat(ReadAll(plain)), triples = Concat(ReadAll(packed));
+    ASSERT_EQ(words.size() / 4 * 3, triples.size());
+    for (size_t i = 0; i < triples.size() / 3; ++i) {
+        ASSERT_EQ(0, memcmp(&words[4 * i + 1], &triples[3 * i], 3)) << "sample " << i;
+    }
+}
+
+TEST(WrapperAudioFileTest, DeviceItemsOfAWaveFile) {
+    sp<QNMediaExtractorWrapper> wrapper = OpenWrapper("items.wav");
+    ASSERT_NE(nullptr, wrapper);
+    sp<AMessage> file, track;
+    ASSERT_EQ(OK, wrapper->getFileFormat(&file));
+    sp<ABuffer> wave;
+    AString text;
+    ASSERT_TRUE(file->findBuffer("AM-waveform1", &wave));
+    EXPECT_EQ((std::vector<uint8_t>{0x00, 0x01, 0xFF, 0xFE, 0x7F, 0xFF}),
+              std::vector<uint8_t>(wave->data(), wave->data() + wave->size()));
+    EXPECT_TRUE(file->findString("qn-usermessage", &text) && text == "hello-device");
+    EXPECT_TRUE(file->findString("qn-vrmeta", &text) && text == "vr180");
+    ASSERT_EQ(OK, wrapper->getTrackFormat(0, &track));
+    int32_t bookmark = 0;
+    EXPECT_TRUE(track->findInt32("AM-bookmarksize", &bookmark));
+    EXPECT_EQ(4660, bookmark);
+}
+
+TEST(WrapperAudioFileTest, AmrFramesMatchThePacketList) {
+    for (const char* name : {"nb.amr", "wb.awb"}) {
+        SCOPED_TRACE(name);
+        sp<QNMediaExtractorWrapper> wrapper = OpenWrapper(name);
+        ASSERT_NE(nullptr, wrapper);
+        sp<AMessage> format;
+        int32_t rate = 0;
+        ASSERT_EQ(OK, wrapper->getTrackFormat(0, &format));
+        ASSERT_TRUE(format->findInt32("sample-rate", &rate));
+        ASSERT_EQ(OK, wrapper->selectTrack(0));
+        const std::vector<Delivered> samples = ReadAll(wrapper);
+        const std::vector<Packet> packets = Packets(name);
+        ASSERT_EQ(packets.size(), samples.size());
+        for (size_t i = 0; i < packets.size(); ++i) {
+            EXPECT_EQ(packets[i].size, samples[i].bytes.size()) << i;
+            EXPECT_EQ(packets[i].pts * 1000000 / rate, samples[i].timeUs) << i;
+        }
+        int64_t bitrate = 0;
+        EXPECT_TRUE(wrapper->getTotalBitrate(&bitrate));
+        EXPECT_GT(bitrate, 0);
+    }
+}

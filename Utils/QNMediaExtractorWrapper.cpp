@@ -418,7 +418,16 @@ size_t QNMediaExtractorWrapper::copySample(const TrackInfo& info, uint8_t* dst) 
     return length;
 }
 
-status_t QNMediaExtractorWrapper::readSampleData(const sp<ABuffer>& buffer) {
+template <typename Buffer>
+void QNMediaExtractorWrapper::deliverSample(const TrackInfo& info, const sp<Buffer>& buffer) {
+    // From the base, so that the range set below covers exactly the copy.
+    const size_t size = copySample(info, buffer->base());
+    buffer->setRange(0, size);
+    if (isConvertTrack(info)) QNMediaEditorUtils::ConvertXto24packed(buffer, mConvertPcmEncoding);
+}
+
+template <typename Buffer>
+status_t QNMediaExtractorWrapper::readIntoCallerBuffer(const sp<Buffer>& buffer, bool warnWhenSmall) {
     std::lock_guard<std::mutex> lock(mLock);
     if (buffer == nullptr) return BAD_VALUE;
     const ssize_t position = fetchTrackSamples();
@@ -426,14 +435,22 @@ status_t QNMediaExtractorWrapper::readSampleData(const sp<ABuffer>& buffer) {
     const TrackInfo& info = mSelectedTracks[position];
     const size_t size = sampleSize(info);
     if (buffer->capacity() < size) {
-        ALOGW("capacity(%u) < samplesize(%u)", static_cast<unsigned>(buffer->capacity()),
-              static_cast<unsigned>(size));
+        if (warnWhenSmall) {
+            ALOGW("capacity(%u) < samplesize(%u)", static_cast<unsigned>(buffer->capacity()),
+                  static_cast<unsigned>(size));
+        }
         return NO_MEMORY;
     }
-    copySample(info, buffer->base());
-    buffer->setRange(0, size);
-    if (isConvertTrack(info)) QNMediaEditorUtils::ConvertXto24packed(buffer, mConvertPcmEncoding);
+    deliverSample(info, buffer);
     return OK;
+}
+
+status_t QNMediaExtractorWrapper::readSampleData(const sp<ABuffer>& buffer) {
+    return readIntoCallerBuffer(buffer, true);
+}
+
+status_t QNMediaExtractorWrapper::readSampleData(const sp<MediaCodecBuffer>& buffer) {
+    return readIntoCallerBuffer(buffer, false);
 }
 
 status_t QNMediaExtractorWrapper::readSampleData(sp<ABuffer>* buffer) {
@@ -441,30 +458,13 @@ status_t QNMediaExtractorWrapper::readSampleData(sp<ABuffer>* buffer) {
     const ssize_t position = fetchTrackSamples();
     if (position < 0 || buffer == nullptr) return ERROR_END_OF_STREAM;
     const TrackInfo& info = mSelectedTracks[position];
-    const size_t size = sampleSize(info);
-    sp<ABuffer> out = new (std::nothrow) ABuffer(size + 4);
+    sp<ABuffer> out = new (std::nothrow) ABuffer(sampleSize(info) + 4);
     if (out == nullptr || out->base() == nullptr) {
         ALOGW("ABuffer is null");
         return NO_MEMORY;
     }
-    copySample(info, out->base());
-    out->setRange(0, size);
-    if (isConvertTrack(info)) QNMediaEditorUtils::ConvertXto24packed(out, mConvertPcmEncoding);
+    deliverSample(info, out);
     *buffer = out;
-    return OK;
-}
-
-status_t QNMediaExtractorWrapper::readSampleData(const sp<MediaCodecBuffer>& buffer) {
-    std::lock_guard<std::mutex> lock(mLock);
-    if (buffer == nullptr) return BAD_VALUE;
-    const ssize_t position = fetchTrackSamples();
-    if (position < 0) return ERROR_END_OF_STREAM;
-    const TrackInfo& info = mSelectedTracks[position];
-    const size_t size = sampleSize(info);
-    if (buffer->capacity() < size) return NO_MEMORY;
-    copySample(info, buffer->base());
-    buffer->setRange(0, size);
-    if (isConvertTrack(info)) QNMediaEditorUtils::ConvertXto24packed(buffer, mConvertPcmEncoding);
     return OK;
 }
 

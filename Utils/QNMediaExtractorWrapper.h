@@ -96,6 +96,10 @@ private:
     int32_t mConvertTrackIndex;
     int32_t mConvertPcmEncoding;
 
+    // The two forms that fill a caller's buffer; takes mLock.
+    template <typename Buffer>
+    status_t readIntoCallerBuffer(const sp<Buffer>& buffer, bool warnWhenSmall);
+
     // These run with mLock held by their caller.
     status_t attachLocked(const sp<DataSource>& source, const sp<IMediaExtractor>& extractor);
     void updateDurationAndBitrate();
@@ -106,6 +110,10 @@ private:
     // Vorbis trailer and answers the bytes written.
     size_t copySample(const TrackInfo& info, uint8_t* dst) const;
     size_t sampleSize(const TrackInfo& info) const;
+    // Copies the pending sample into `buffer` with the range (0, its size),
+    // re-packed when the track is marked.
+    template <typename Buffer>
+    void deliverSample(const TrackInfo& info, const sp<Buffer>& buffer);
     bool isConvertTrack(const TrackInfo& info) const;
 
     QNMediaExtractorWrapper(const QNMediaExtractorWrapper&) = delete;

@@ -1,62 +1,18 @@
 #include <gtest/gtest.h>
 
-#include <fcntl.h>
-#include <sys/stat.h>
-#include <unistd.h>
-
 #include "QNMediaEditorDefs.h"
-#include "QNMediaExtractorWrapper.h"
-#include "extractors/AudioMediaFacts.h"
+#include "WrapperMedia.h"
 
 using namespace android;
 using namespace android::qnmediaeditor;
 using namespace audiotest;
-
-namespace {
-
-sp<QNMediaExtractorWrapper> OpenWrapper(const std::string& name) {
-    const int fd = open(MediaPath(name).c_str(), O_RDONLY);
-    struct stat st;
-    if (fd < 0 || fstat(fd, &st) != 0) return nullptr;
-    sp<QNMediaExtractorWrapper> wrapper = new QNMediaExtractorWrapper;
-    const status_t err = wrapper->setDataSource(fd, 0, st.st_size);
-    close(fd);  // the wrapper keeps its own
-    return err == OK ? wrapper : nullptr;
-}
-
-struct Delivered {
-    size_t track;
-    int64_t timeUs;
-    std::vector<uint8_t> bytes;
-};
-
-std::vector<Delivered> ReadAll(const sp<QNMediaExtractorWrapper>& wrapper) {
-    std::vector<Delivered> out;
-    Delivered d;
-    sp<ABuffer> buffer;
-    while (wrapper->getSampleTrackIndex(&d.track) == OK) {
-        EXPECT_EQ(OK, wrapper->getSampleTime(&d.timeUs));
-        EXPECT_EQ(OK, wrapper->readSampleData(&buffer));
-        d.bytes.assign(buffer->data(), buffer->data() + buffer->size());
-        out.push_back(d);
-        EXPECT_EQ(OK, wrapper->advance());
-    }
-    return out;
-}
-
-std::vector<uint8_t> Concat(const std::vector<Delivered>& samples) {
-    std::vector<uint8_t> all;
-    for (const Delivered& s : samples) all.insert(all.end(), s.bytes.begin(), s.bytes.end());
-    return all;
-}
-
-}  // namespace
+using namespace wrappertest;
 
 TEST(WrapperAudioFileTest, PcmFilesReadBackWholeAndInOrder) {
     for (const char* name : {"u8_mono.wav", "s16_stereo.wav", "s24_mono.wav", "s24_ext_6ch.wav", "s32_stereo.wav",
                              "f32_mono.wav"}) {
         SCOPED_TRACE(name);
-        sp<QNMediaExtractorWrapper> wrapper = OpenWrapper(name);
+        sp<QNMediaExtractorWrapper> wrapper = OpenWrapper(MediaPath(name));
         ASSERT_NE(nullptr, wrapper);
         ASSERT_EQ(1u, wrapper->countTracks());
         ASSERT_EQ(OK, wrapper->selectTrack(0));
@@ -76,8 +32,8 @@ TEST(WrapperAudioFileTest, PcmFilesReadBackWholeAndInOrder) {
 }
 
 TEST(WrapperAudioFileTest, ThirtyTwoBitTracksArePackedOnceTheirFormatIsAsked) {
-    sp<QNMediaExtractorWrapper> plain = OpenWrapper("s32_stereo.wav");
-    sp<QNMediaExtractorWrapper> packed = OpenWrapper("s32_stereo.wav");
+    sp<QNMediaExtractorWrapper> plain = OpenWrapper(MediaPath("s32_stereo.wav"));
+    sp<QNMediaExtractorWrapper> packed = OpenWrapper(MediaPath("s32_stereo.wav"));
     ASSERT_NE(nullptr, plain);
     ASSERT_NE(nullptr, packed);
     sp<AMessage> format;
@@ -97,7 +53,7 @@ TEST(WrapperAudioFileTest, ThirtyTwoBitTracksArePackedOnceTheirFormatIsAsked) {
 }
 
 TEST(WrapperAudioFileTest, DeviceItemsOfAWaveFile) {
-    sp<QNMediaExtractorWrapper> wrapper = OpenWrapper("items.wav");
+    sp<QNMediaExtractorWrapper> wrapper = OpenWrapper(MediaPath("items.wav"));
     ASSERT_NE(nullptr, wrapper);
     sp<AMessage> file, track;
     ASSERT_EQ(OK, wrapper->getFileFormat(&file));
@@ -117,7 +73,7 @@ TEST(WrapperAudioFileTest, DeviceItemsOfAWaveFile) {
 TEST(WrapperAudioFileTest, AmrFramesMatchThePacketList) {
     for (const char* name : {"nb.amr", "wb.awb"}) {
         SCOPED_TRACE(name);
-        sp<QNMediaExtractorWrapper> wrapper = OpenWrapper(name);
+        sp<QNMediaExtractorWrapper> wrapper = OpenWrapper(MediaPath(name));
         ASSERT_NE(nullptr, wrapper);
         sp<AMessage> format;
         int32_t rate = 0;

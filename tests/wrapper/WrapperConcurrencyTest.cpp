@@ -6,11 +6,51 @@
 #include <media/stagefright/FileSource.h>
 
 #include "FakeMedia.h"
+#include "WrapperMedia.h"
 
 using namespace android;
 using namespace wrappertest;
 
 namespace {
+
+// Consumes every sample on one thread while two others peek and ask formats
+// and one toggles `toggleTrack` (if any), whose samples come after all others.
+std::vector<Delivered> ConsumeUnderContention(const sp<QNMediaExtractorWrapper>& wrapper, ssize_t toggleTrack) {
+    std::vector<Delivered> delivered;
+    std::atomic<bool> done{false};
+    std::vector<std::thread> others;
+    if (toggleTrack >= 0) {
+        others.emplace_back([&] {
+            while (!done) {
+                wrapper->selectTrack(toggleTrack);
+                wrapper->unselectTrack(toggleTrack);
+            }
+        });
+    }
+    for (int i = 0; i < 2; ++i) {
+        others.emplace_back([&] {
+            while (!done) {
+                int64_t t;
+                size_t index;
+                sp<MetaData> meta;
+                sp<AMessage> format;
+                wrapper->getSampleTime(&t);
+                wrapper->getSampleTrackIndex(&index);
+                wrapper->getSampleMeta(&meta);
+                wrapper->readSampleData(sp<ABuffer>(new ABuffer(16)));
+                wrapper->getTrackFormat(0, &format);
+                wrapper->getTrackMeta(0, 0);
+                wrapper->countTracks();
+                wrapper->getTotalBitrate(&t);
+            }
+        });
+    }
+    Delivered d;
+    while (TakeSample(wrapper, &d) && static_cast<ssize_t>(d.track) != toggleTrack) delivered.push_back(d);
+    done = true;
+    for (std::thread& t : others) t.join();
+    return delivered;
+}
 
 std::vector<Step> numbered(uint8_t track, int count, int64_t stepUs, int64_t startUs = 0) {
     std::vector<Step> steps;
@@ -22,66 +62,38 @@ std::vector<Step> numbered(uint8_t track, int count, int64_t stepUs, int64_t sta
 
 }  // namespace
 
-// One thread consumes; others peek, ask formats and toggle a track whose
-// samples lie after all others. Every counted sample arrives once, in order.
 TEST(WrapperConcurrencyTest, SharedWrapperDeliversEverySampleOnce) {
     BufferLedger ledger;
     sp<FakeExtractor> extractor = new FakeExtractor;
-    const int kVideo = 300, kAudio = 470;
-    extractor->addTrack("video/avc", numbered(0, kVideo, 33333), &ledger);
-    extractor->addTrack("audio/mp4a-latm", numbered(1, kAudio, 21333), &ledger);
+    const int kCounts[2] = {300, 470};
+    extractor->addTrack("video/avc", numbered(0, kCounts[0], 33333), &ledger);
+    extractor->addTrack("audio/mp4a-latm", numbered(1, kCounts[1], 21333), &ledger);
     extractor->addTrack("audio/raw", numbered(2, 1000, 1, int64_t(1) << 40), &ledger);
     sp<TestWrapper> wrapper = new TestWrapper;
     ASSERT_EQ(OK, wrapper->setExtractorForTest(new BufferDataSource("x", 1), extractor));
     ASSERT_EQ(OK, wrapper->selectTrack(1));
     ASSERT_EQ(OK, wrapper->selectTrack(0));
 
-    std::atomic<bool> done{false};
-    std::vector<int> next(2, 0);
-    bool ordered = true;
-    std::thread consumer([&] {
-        for (;;) {
-            sp<ABuffer> buffer;
-            if (wrapper->readSampleData(&buffer) != OK || buffer->size() != 3 || buffer->data()[0] == 2) break;
-            const int track = buffer->data()[0], seq = buffer->data()[1] | buffer->data()[2] << 8;
-            ordered = ordered && seq == next[track];
-            ++next[track];
-            if (wrapper->advance() != OK) break;
-        }
-        done = true;
-    });
-    std::vector<std::thread> others;
-    others.emplace_back([&] {
-        while (!done) {
-            wrapper->selectTrack(2);
-            wrapper->unselectTrack(2);
-        }
-    });
-    for (int i = 0; i < 2; ++i) {
-        others.emplace_back([&] {
-            while (!done) {
-                int64_t t;
-                size_t index;
-                sp<MetaData> meta;
-                sp<AMessage> format;
-                sp<ABuffer> peek = new ABuffer(16);
-                wrapper->getSampleTime(&t);
-                wrapper->getSampleTrackIndex(&index);
-                wrapper->getSampleMeta(&meta);
-                wrapper->readSampleData(peek);
-                wrapper->getTrackFormat(1, &format);
-                wrapper->getTrackMeta(0, 0);
-                wrapper->countTracks();
-                wrapper->getTotalBitrate(&t);
-            }
-        });
+    int next[2] = {0, 0};
+    for (const Delivered& d : ConsumeUnderContention(wrapper, 2)) {
+        ASSERT_LT(d.track, 2u);
+        ASSERT_EQ(next[d.track]++, d.bytes[1] | d.bytes[2] << 8) << "track " << d.track;
     }
-    consumer.join();
-    for (std::thread& t : others) t.join();
-
-    EXPECT_TRUE(ordered);
-    EXPECT_EQ(kVideo, next[0]);
-    EXPECT_EQ(kAudio, next[1]);
+    EXPECT_EQ(kCounts[0], next[0]);
+    EXPECT_EQ(kCounts[1], next[1]);
     wrapper.clear();
     EXPECT_EQ(0, ledger.outstanding);
+}
+
+TEST(WrapperConcurrencyTest, SharedWrapperReadsARealFileOnce) {
+    sp<QNMediaExtractorWrapper> wrapper = OpenWrapper(audiotest::MediaPath("nb.amr"));
+    ASSERT_NE(nullptr, wrapper);
+    ASSERT_EQ(OK, wrapper->selectTrack(0));
+    const std::vector<Delivered> delivered = ConsumeUnderContention(wrapper, -1);
+    const std::vector<audiotest::Packet> packets = audiotest::Packets("nb.amr");
+    ASSERT_EQ(packets.size(), delivered.size());
+    for (size_t i = 0; i < packets.size(); ++i) {
+        EXPECT_EQ(packets[i].pts * 125, delivered[i].timeUs) << i;  // 8 kHz ticks
+        EXPECT_EQ(packets[i].size, delivered[i].bytes.size()) << i;
+    }
 }

@@ -1,27 +1,26 @@
-// Copies every sample of every track of an MP4 into a new MP4, the way the
-// editor writes a trimmed recording: samples read in time order, copied
-// into buffers of their own and pushed into one MediaAdapter per track,
-// which the MP4 writer's readers drain to the file. The input comes from
+// Copies every sample of every track of an MP4 into a new MP4 the way the
+// editor service does: the extractor wrapper reads the samples in time
+// order, the muxer pushes each into its track's MediaAdapter and the MP4
+// writer's readers drain them to the file. The input comes from
 // make_bench_mp4.sh; remux_bench.sh runs this beside ffmpeg and cp.
 
 #include <benchmark/benchmark.h>
 
 #include <fcntl.h>
 #include <sys/resource.h>
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include <cstdlib>
-#include <cstring>
-#include <vector>
 
-#include <media/stagefright/FileSource.h>
-#include <media/stagefright/MPEG4Writer.h>
-#include <media/stagefright/MediaAdapter.h>
-#include <media/stagefright/MediaBuffer.h>
 #include <media/stagefright/MediaErrors.h>
-#include <media/stagefright/MediaExtractorFactory.h>
+#include <media/stagefright/MetaData.h>
+
+#include "QNMediaExtractorWrapper.h"
+#include "QNMediaMuxer.h"
 
 using namespace android;
+using namespace android::qnmediaeditor;
 
 namespace {
 
@@ -30,71 +29,39 @@ const char* EnvOr(const char* name, const char* fallback) {
     return value != nullptr ? value : fallback;
 }
 
-struct Track {
-    sp<IMediaSource> source;
-    sp<MediaAdapter> adapter;
-    MediaBufferBase* sample = nullptr;
-    int64_t timeUs = 0;
-};
-
-bool Fill(Track* t) {
-    t->sample = nullptr;
-    if (t->source->read(&t->sample) != OK) return false;
-    t->sample->meta_data().findInt64(kKeyTime, &t->timeUs);
-    return true;
-}
-
-// A copy of the sample with its times and marks, as the muxer pushes it.
-MediaBuffer* Copy(MediaBufferBase* in) {
-    MediaBuffer* out = new MediaBuffer(in->range_length());
-    memcpy(out->data(), static_cast<const uint8_t*>(in->data()) + in->range_offset(), in->range_length());
-    MetaDataBase& from = in->meta_data();
-    MetaDataBase& to = out->meta_data();
-    int64_t time = 0;
-    int32_t flag = 0;
-    if (from.findInt64(kKeyTime, &time)) to.setInt64(kKeyTime, time);
-    if (from.findInt64(kKeyDecodingTime, &time)) to.setInt64(kKeyDecodingTime, time);
-    if (from.findInt32(kKeyIsSyncFrame, &flag) && flag) to.setInt32(kKeyIsSyncFrame, 1);
-    out->add_ref();
-    return out;
-}
-
 bool RemuxAll(const char* in, const char* out, size_t* samples, size_t* bytes) {
-    sp<IMediaExtractor> extractor = MediaExtractorFactory::Create(new FileSource(in), nullptr);
-    if (extractor == nullptr) return false;
-    const int fd = open(out, O_CREAT | O_TRUNC | O_RDWR, 0644);
-    if (fd < 0) return false;
-    sp<MPEG4Writer> writer = new MPEG4Writer(fd);
-    std::vector<Track> tracks(extractor->countTracks());
-    for (size_t i = 0; i < tracks.size(); ++i) {
-        tracks[i].source = extractor->getTrack(i);
-        tracks[i].adapter = new MediaAdapter(extractor->getTrackMetaData(i));
-        writer->addSource(tracks[i].adapter);
-        tracks[i].source->start();
-        Fill(&tracks[i]);
+    const int inFd = open(in, O_RDONLY);
+    const int outFd = open(out, O_CREAT | O_TRUNC | O_RDWR, 0644);
+    struct stat st;
+    bool ok = inFd >= 0 && outFd >= 0 && fstat(inFd, &st) == 0;
+    sp<QNMediaExtractorWrapper> extractor = new QNMediaExtractorWrapper;
+    ok = ok && extractor->setDataSource(inFd, 0, st.st_size) == OK;
+    sp<QNMediaMuxer> muxer = new QNMediaMuxer(outFd, OUTPUT_FILE_FORMAT_MPEG_4);
+    for (size_t i = 0; ok && i < extractor->countTracks(); ++i) {
+        sp<AMessage> format;
+        ok = extractor->getTrackFormat(i, &format) == OK && muxer->addTrack(format) == int32_t(i) &&
+             extractor->selectTrack(i) == OK;
     }
-    sp<MetaData> params = new MetaData;
-    params->setInt32(kKeyRealTimeRecording, 0);
-    bool ok = writer->start(params.get()) == OK;
-    while (ok) {
-        Track* next = nullptr;
-        for (Track& t : tracks) {
-            if (t.sample != nullptr && (next == nullptr || t.timeUs < next->timeUs)) next = &t;
-        }
-        if (next == nullptr) break;
+    ok = ok && muxer->start() == OK;
+    size_t track = 0;
+    int64_t timeUs = 0;
+    while (ok && extractor->getSampleTrackIndex(&track) == OK) {
+        sp<ABuffer> sample;
+        sp<MetaData> meta;
+        int32_t sync = 0;
+        ok = extractor->getSampleTime(&timeUs) == OK && extractor->getSampleMeta(&meta) == OK &&
+             extractor->readSampleData(&sample) == OK;
+        if (!ok) break;
+        const uint32_t flags = meta->findInt32(kKeyIsSyncFrame, &sync) && sync ? 1 : 0;
         ++*samples;
-        *bytes += next->sample->range_length();
-        ok = next->adapter->pushBuffer(Copy(next->sample)) == OK;
-        next->sample->release();
-        Fill(next);
+        *bytes += sample->size();
+        ok = muxer->writeSampleData(0, sample, uint32_t(track), timeUs, flags) == OK && extractor->advance() == OK;
     }
-    for (Track& t : tracks) {
-        if (t.sample != nullptr) t.sample->release();
-        t.adapter->stop();
-        t.source->stop();
-    }
-    ok = writer->stop() == OK && ok;
-    close(fd);
+    ok = muxer->stop() == OK && ok;
+    muxer.clear();
+    extractor.clear();
+    if (inFd >= 0) close(inFd);
+    if (outFd >= 0) close(outFd);
     return ok;
 }
 

@@ -1,5 +1,6 @@
 #!/usr/bin/env bash
-# Times the lossless copy of a ~120 MB MP4 through the MP4 writer against
+# Times the lossless copy of a ~120 MB MP4 (extractor wrapper -> muxer ->
+# MP4 writer) against
 # `ffmpeg -i IN -map 0 -c copy OUT.mp4` and `cp IN OUT`, best of N runs each,
 # with peak memory. Usage: remux_bench.sh BUILD_DIR [FILE]
 set -euo pipefail
@@ -33,6 +34,6 @@ ffmpeg -hide_banner -loglevel error -i "$out/ours.mp4" -map 0 -c copy -f null - 
 echo "file: $file ($(stat -c %s "$file") bytes)"
 echo "cp:             ${cp_r% *} s, peak RSS $((${cp_r#* } / 1024)) MB"
 echo "ffmpeg -c copy: ${ff_r% *} s, peak RSS $((${ff_r#* } / 1024)) MB"
-echo "MP4 writer:     ${ours_s} s, peak RSS $((mem / 1024)) MB"
-echo "time ratio writer / ffmpeg: $(jq -n "$ours_s / ${ff_r% *} * 100 | round / 100")"
-echo "time ratio writer / cp:     $(jq -n "$ours_s / ${cp_r% *} * 100 | round / 100")"
+echo "wrapper->muxer: ${ours_s} s, peak RSS $((mem / 1024)) MB"
+echo "time ratio ours / ffmpeg: $(jq -n "$ours_s / ${ff_r% *} * 100 | round / 100")"
+echo "time ratio ours / cp:     $(jq -n "$ours_s / ${cp_r% *} * 100 | round / 100")"

@@ -1,0 +1,85 @@
+#include "Input.h"
+
+#include <cerrno>
+#include <cstring>
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <media/stagefright/FileSource.h>
+#include <media/stagefright/MediaErrors.h>
+#include <media/stagefright/MediaExtractorFactory.h>
+
+#include "Cli.h"
+#include "QNMediaEditorDefs.h"
+
+using namespace android;
+using namespace android::qnmediaeditor;
+
+namespace qnedit {
+
+std::string describeStatus(int status) {
+    switch (status) {
+        case ERROR_UNSUPPORTED: return "not a supported media file";
+        case ERROR_MALFORMED: return "malformed data";
+        case ERROR_IO: return "read error";
+        case ERROR_END_OF_STREAM: return "no samples";
+        case NO_MEMORY: return "out of memory";
+        case NO_INIT: return "cannot be read";
+        case BAD_VALUE: return "bad value";
+        case INVALID_OPERATION: return "invalid operation";
+        default: return "error " + std::to_string(status);
+    }
+}
+
+Input::Input(const std::string& path, bool flacRaw) : mPath(path) {
+    mFd = open(path.c_str(), O_RDONLY | O_CLOEXEC);
+    if (mFd < 0) inputError(path + ": cannot open (" + strerror(errno) + ")");
+    struct stat st;
+    if (fstat(mFd, &st) != 0 || !S_ISREG(st.st_mode)) inputError(path + ": not a regular file");
+    mFileSize = st.st_size;
+    mWrapper = new QNMediaExtractorWrapper();
+    const status_t err = mWrapper->setDataSource(mFd, 0, mFileSize);
+    if (err != OK) inputError(path + ": " + describeStatus(err));
+    if (flacRaw) {
+        mWrapper->setFlacRaw(true);
+        mWrapper->setOutputFormatFlag(kEditorExtractorOutputFormat_FlacRaw);
+    }
+    if (mWrapper->getFileFormat(&mFileFormat) != OK || mFileFormat == nullptr) {
+        inputError(path + ": cannot read the file format");
+    }
+    for (size_t i = 0; i < mWrapper->countTracks(); ++i) {
+        sp<AMessage> format;
+        const status_t e = mWrapper->getTrackFormat(i, &format);
+        if (e != OK || format == nullptr) inputError(path + ": track " + std::to_string(i) + ": " + describeStatus(e));
+        mTrackFormats.push_back(format);
+    }
+    if (mTrackFormats.empty()) inputError(path + ": no tracks");
+    // The wrapper does not hand out the file metadata; the platform does.
+    sp<IMediaExtractor> extractor = MediaExtractorFactory::Create(new FileSource(mFd, 0, mFileSize));
+    if (extractor != nullptr) mPlatformMeta = extractor->getMetaData();
+}
+
+Input::~Input() {
+    mWrapper.clear();
+    if (mFd >= 0) close(mFd);
+}
+
+int64_t Input::durationUs() const {
+    int64_t longest = -1;
+    for (const auto& f : mTrackFormats) {
+        int64_t d;
+        if (f->findInt64("durationUs", &d) && d > longest) longest = d;
+    }
+    return longest;
+}
+
+std::string Input::mimeOf(const sp<AMessage>& format) {
+    AString mime;
+    return format != nullptr && format->findString("mime", &mime) ? std::string(mime.c_str()) : std::string();
+}
+
+bool Input::isVideo(const sp<AMessage>& format) { return mimeOf(format).rfind("video/", 0) == 0; }
+bool Input::isAudio(const sp<AMessage>& format) { return mimeOf(format).rfind("audio/", 0) == 0; }
+
+}  // namespace qnedit

@@ -1,0 +1,269 @@
+#include <algorithm>
+#include <cmath>
+#include <map>
+#include <set>
+
+#include <media/MediaTrack.h>
+#include <media/stagefright/MediaDefs.h>
+#include <media/stagefright/MetaData.h>
+#include <media/stagefright/foundation/ABuffer.h>
+
+#include "Cli.h"
+#include "Commands.h"
+#include "DeviceItems.h"
+#include "Input.h"
+#include "OutputFile.h"
+#include "Progress.h"
+#include "QNMediaFlacFrameConverter.h"
+#include "QNMediaMuxer.h"
+
+using namespace android;
+using namespace android::qnmediaeditor;
+
+namespace qnedit {
+
+const char* const kTrimHelp =
+    "usage: qnedit trim IN OUT --start SEC [--end SEC] [--tracks LIST] [--format mp4|m4a|wav|flac|amr]\n"
+    "                  [--keyframe]\n"
+    "\n"
+    "Cuts IN losslessly into OUT. Reading starts at the sync sample at or before\n"
+    "--start; in MP4 and M4A output the presentation still starts exactly at\n"
+    "--start (the frames before it are kept for decoding and hidden by an edit\n"
+    "list). The device's items are kept, the stored waveform cut to the range.\n"
+    "  --start SEC    where the result starts\n"
+    "  --end SEC      where it ends (default: the end of the file)\n"
+    "  --tracks LIST  track indices to keep, e.g. 0,1 (default: all that fit the format)\n"
+    "  --format F     output format; by default from OUT's extension\n"
+    "  --keyframe     start at the sync sample itself instead of --start\n"
+    "FLAC is trimmed by whole frames, renumbered with a new stream header; 32-bit\n"
+    "integer or float WAV comes out as 24-bit.\n";
+
+namespace {
+
+struct Plan {
+    std::string format;
+    int muxFormat;
+    std::vector<size_t> tracks;  // source track indices, in muxer order
+};
+
+int muxFormatFor(const std::string& f) {
+    if (f == "mp4") return OUTPUT_FILE_FORMAT_MPEG_4;
+    if (f == "m4a") return OUTPUT_FILE_FORMAT_M4A;
+    if (f == "wav") return OUTPUT_FILE_FORMAT_WAVE;
+    if (f == "flac") return OUTPUT_FILE_FORMAT_FLAC;
+    if (f == "amr") return OUTPUT_FILE_FORMAT_AMR_A;
+    usageError("unknown output format '" + f + "' (mp4, m4a, wav, flac or amr)");
+}
+
+bool trackFits(const std::string& format, const sp<AMessage>& trackFormat) {
+    const std::string mime = Input::mimeOf(trackFormat);
+    if (format == "mp4") {
+        return mime == MEDIA_MIMETYPE_VIDEO_AVC || mime == MEDIA_MIMETYPE_VIDEO_HEVC ||
+               mime == MEDIA_MIMETYPE_AUDIO_AAC || mime == MEDIA_MIMETYPE_AUDIO_AMR_NB ||
+               mime == MEDIA_MIMETYPE_AUDIO_AMR_WB;
+    }
+    if (format == "m4a") return mime == MEDIA_MIMETYPE_AUDIO_AAC;
+    if (format == "wav") return mime == MEDIA_MIMETYPE_AUDIO_RAW;
+    if (format == "flac") return mime == MEDIA_MIMETYPE_AUDIO_FLAC || mime == MEDIA_MIMETYPE_AUDIO_RAW;
+    if (format == "amr") return mime == MEDIA_MIMETYPE_AUDIO_AMR_NB || mime == MEDIA_MIMETYPE_AUDIO_AMR_WB;
+    return false;
+}
+
+Plan makePlan(const Args& args, const Input& in, const std::string& outPath) {
+    Plan plan;
+    plan.format = args.get("--format", lowerExtension(outPath));
+    if (plan.format == "3gp" || plan.format == "mov") plan.format = "mp4";
+    plan.muxFormat = muxFormatFor(plan.format);
+    const bool singleTrack = plan.format == "wav" || plan.format == "flac" || plan.format == "amr";
+    if (args.has("--tracks")) {
+        for (const std::string& item : splitList(args.get("--tracks"))) {
+            const long index = parseInt(item, "--tracks");
+            if (index < 0 || static_cast<size_t>(index) >= in.trackCount()) {
+                usageError("--tracks: no track " + item + " in " + in.path());
+            }
+            if (!trackFits(plan.format, in.trackFormat(index))) {
+                inputError(in.path() + ": track " + item + " (" + Input::mimeOf(in.trackFormat(index)) +
+                           ") cannot go into " + plan.format + " output");
+            }
+            if (std::find(plan.tracks.begin(), plan.tracks.end(), size_t(index)) == plan.tracks.end()) {
+                plan.tracks.push_back(static_cast<size_t>(index));
+            }
+        }
+    } else {
+        for (size_t i = 0; i < in.trackCount(); ++i) {
+            if (trackFits(plan.format, in.trackFormat(i))) plan.tracks.push_back(i);
+        }
+    }
+    if (plan.tracks.empty()) inputError(in.path() + ": no track can go into " + plan.format + " output");
+    if (singleTrack && plan.tracks.size() > 1) plan.tracks.resize(1);
+    return plan;
+}
+
+// Frame rate in hundredths of a frame per second, from the spacing of the
+// first video samples after the cut point.
+int estimateFps100(QNMediaExtractorWrapper& w, size_t videoTrack, int64_t startUs) {
+    if (w.selectTrack(videoTrack) != OK) return 0;
+    std::vector<int64_t> times;
+    if (w.seekTo(startUs, MediaTrack::ReadOptions::SEEK_PREVIOUS_SYNC) == OK) {
+        int64_t t;
+        while (times.size() < 32 && w.getSampleTime(&t) == OK) {
+            times.push_back(t);
+            if (w.advance() != OK) break;
+        }
+    }
+    w.unselectTrack(videoTrack);
+    std::sort(times.begin(), times.end());
+    std::vector<int64_t> deltas;
+    for (size_t i = 1; i < times.size(); ++i) {
+        if (times[i] > times[i - 1]) deltas.push_back(times[i] - times[i - 1]);
+    }
+    if (deltas.empty()) return 0;
+    std::nth_element(deltas.begin(), deltas.begin() + deltas.size() / 2, deltas.end());
+    const double period = static_cast<double>(deltas[deltas.size() / 2]);
+    return static_cast<int>(std::lround(100e6 / period));
+}
+
+struct TrackState {
+    size_t muxIndex = 0;
+    bool video = false;
+    bool pcm = false;
+    int frameBytes = 0;   // PCM: bytes per sample frame as delivered
+    int sampleRate = 0;   // PCM
+    sp<QNMediaFlacFrameConverter> flac;
+};
+
+// PCM is cut to the exact sample frame; the buffer is trimmed in place.
+bool cutPcm(const TrackState& t, int64_t timeUs, int64_t startUs, int64_t endUs, sp<ABuffer>& buffer,
+            int64_t* outTimeUs) {
+    const int64_t frames = static_cast<int64_t>(buffer->size()) / t.frameBytes;
+    int64_t first = 0, last = frames;
+    if (timeUs < startUs) first = std::min(frames, (startUs - timeUs) * t.sampleRate / 1000000);
+    if (endUs >= 0) last = std::min(last, std::max<int64_t>(0, (endUs - timeUs) * t.sampleRate / 1000000));
+    if (last <= first) return false;
+    buffer->setRange(buffer->offset() + first * t.frameBytes, (last - first) * t.frameBytes);
+    *outTimeUs = timeUs + first * 1000000 / t.sampleRate;
+    return true;
+}
+
+}  // namespace
+
+int runTrim(const std::vector<std::string>& words) {
+    Args args(words, {"--start", "--end", "--tracks", "--format"}, {"--keyframe"});
+    args.expectPositional(2, "qnedit trim IN OUT --start SEC [--end SEC] [--tracks LIST] [--format F]");
+    if (!args.has("--start")) usageError("--start is required");
+    const std::string inPath = args.positional()[0], outPath = args.positional()[1];
+    const int64_t startUs = static_cast<int64_t>(std::llround(args.getDouble("--start", 0) * 1e6));
+    const int64_t endUs = args.has("--end") ? static_cast<int64_t>(std::llround(args.getDouble("--end", 0) * 1e6)) : -1;
+    if (startUs < 0) usageError("--start must not be negative");
+    if (endUs >= 0 && endUs <= startUs) usageError("--end must come after --start");
+
+    const std::string wanted = args.get("--format", lowerExtension(outPath));
+    Input in(inPath, wanted == "flac");
+    const Plan plan = makePlan(args, in, outPath);
+    if (in.durationUs() >= 0 && startUs >= in.durationUs()) {
+        inputError(inPath + ": --start lies past the end (" + std::to_string(in.durationUs() / 1e6) + " s)");
+    }
+
+    OutputFile out(outPath);
+    sp<QNMediaMuxer> muxer = new QNMediaMuxer(out.fd(), static_cast<OutputFileFormat>(plan.muxFormat));
+    if (muxer->getMuxerState() != QNMediaMuxer::INITIALIZED) inputError(outPath + ": output format not supported");
+
+    QNMediaExtractorWrapper& w = in.wrapper();
+    std::map<size_t, TrackState> states;
+    for (size_t source : plan.tracks) {
+        sp<AMessage> format = in.trackFormat(source)->dup();
+        TrackState t;
+        t.video = Input::isVideo(format);
+        const std::string mime = Input::mimeOf(format);
+        if (mime == MEDIA_MIMETYPE_AUDIO_FLAC) {
+            int32_t trim = 0;
+            if (!format->findInt32("editor-flactrim", &trim) || !trim) {
+                inputError(inPath + ": this FLAC stream has a variable block size and cannot be trimmed losslessly");
+            }
+            t.flac = new QNMediaFlacFrameConverter(format);
+        }
+        if (mime == MEDIA_MIMETYPE_AUDIO_RAW) {
+            int32_t channels = 0, bits = 16;
+            format->findInt32("channel-count", &channels);
+            format->findInt32("sample-rate", &t.sampleRate);
+            format->findInt32("bits-per-sample", &bits);
+            t.pcm = channels > 0 && t.sampleRate > 0;
+            t.frameBytes = channels * ((bits + 7) / 8);
+            if (t.frameBytes <= 0) t.pcm = false;
+        }
+        const ssize_t index = muxer->addTrack(format);
+        if (index < 0) inputError(outPath + ": the writer refused track " + std::to_string(source) + " (" + mime + ")");
+        t.muxIndex = static_cast<size_t>(index);
+        states[source] = t;
+    }
+    copyDeviceItems(in, *muxer, plan.muxFormat, startUs, endUs);
+    for (size_t source : plan.tracks) {
+        if (states[source].video) {
+            const int fps100 = estimateFps100(w, source, startUs);
+            if (fps100 > 0) muxer->setVideoFPS(fps100);
+            break;
+        }
+    }
+    if (muxer->start() != OK) inputError(outPath + ": cannot start writing");
+
+    for (size_t source : plan.tracks) w.selectTrack(source);
+    if (w.seekTo(startUs, MediaTrack::ReadOptions::SEEK_PREVIOUS_SYNC) != OK) inputError(inPath + ": nothing to read at --start");
+
+    // The presentation starts at --start, or at the sync sample with --keyframe.
+    int64_t originUs = startUs;
+    if (args.has("--keyframe")) {
+        int64_t first;
+        if (w.getSampleTime(&first) == OK) originUs = std::min(first, startUs);
+    }
+    for (auto& entry : states) {
+        TrackState& t = entry.second;
+        if (!t.flac) continue;
+        sp<ABuffer> csd;
+        if (!t.flac->getCSDBuffer(&csd, 0)) inputError(inPath + ": no FLAC stream header");
+        if (muxer->writeSampleData(0, csd, t.muxIndex, 0, 2) != OK) inputError(outPath + ": write failed");
+    }
+
+    Progress progress("trim", (endUs >= 0 ? endUs : in.durationUs()) - startUs);
+    std::set<size_t> open(plan.tracks.begin(), plan.tracks.end());
+    size_t source;
+    while (!open.empty() && w.getSampleTrackIndex(&source) == OK) {
+        int64_t timeUs = 0;
+        sp<MetaData> meta;
+        w.getSampleTime(&timeUs);
+        w.getSampleMeta(&meta);
+        TrackState& t = states[source];
+        if (endUs >= 0 && timeUs >= endUs) {
+            w.unselectTrack(source);
+            open.erase(source);
+            continue;
+        }
+        sp<ABuffer> buffer;
+        const status_t err = w.readSampleData(&buffer);
+        if (err != OK) inputError(inPath + ": " + describeStatus(err));
+        uint32_t flags = 0;
+        int32_t sync = 0;
+        if (meta != nullptr && meta->findInt32(kKeyIsSyncFrame, &sync) && sync) flags |= 1;
+        int64_t writeTimeUs = timeUs;
+        bool keep = true;
+        if (t.pcm && (plan.format == "wav" || plan.format == "flac")) keep = cutPcm(t, timeUs, originUs, endUs, buffer, &writeTimeUs);
+        if (t.flac != nullptr) {
+            sp<ABuffer> converted;
+            if (!t.flac->convert(buffer, &converted)) inputError(inPath + ": unreadable FLAC frame at " + std::to_string(timeUs / 1e6) + " s");
+            buffer = converted;
+        }
+        if (keep) {
+            const status_t werr = muxer->writeSampleData(t.video ? 1 : 0, buffer, t.muxIndex, writeTimeUs - originUs, flags);
+            if (werr != OK) inputError(outPath + ": write failed (" + describeStatus(werr) + ")");
+        }
+        progress.update(timeUs - startUs);
+        if (w.advance() != OK) break;
+    }
+    progress.finish();
+    const status_t stopErr = muxer->stop();
+    muxer.clear();
+    if (stopErr != OK) inputError(outPath + ": could not be completed (" + describeStatus(stopErr) + ")");
+    out.commit();
+    return kExitOk;
+}
+
+}  // namespace qnedit

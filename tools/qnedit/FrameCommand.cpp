@@ -1,0 +1,148 @@
+#include <cerrno>
+#include <cstring>
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+#include <vector>
+
+#include <kvucmm/FrameConverter.h>
+#include <media/stagefright/foundation/AMessage.h>
+#include <media/stagefright/foundation/ColorUtils.h>
+
+#include "Cli.h"
+#include "Commands.h"
+#include "Input.h"
+#include "OutputFile.h"
+#include "Png.h"
+#include "QNMediaEditorColorUtils.h"
+
+using namespace android;
+using namespace android::qnmediaeditor;
+
+namespace qnedit {
+
+const char* const kFrameHelp =
+    "usage: qnedit frame IN.yuv --size WxH --format nv12|nv21|i420|yv12 [--stride N]\n"
+    "                   [--slice-height N] [--crop L,T,R,B] [--range limited|full]\n"
+    "                   [--standard bt601|bt709|bt2020] -o OUT.png\n"
+    "\n"
+    "Turns one decoded 4:2:0 frame into an RGB 5:6:5 picture through the colour\n"
+    "converter and saves it as PNG.\n"
+    "  --size WxH          the picture size\n"
+    "  --format F          the frame's layout\n"
+    "  --stride N          bytes from one luma row to the next (default: width)\n"
+    "  --slice-height N    luma rows before the chroma plane (default: height)\n"
+    "  --crop L,T,R,B      the visible rectangle, inclusive (default: the whole picture)\n"
+    "  --range R           limited (default) or full\n"
+    "  --standard S        colour matrix: bt601 (default), bt709 or bt2020\n";
+
+namespace {
+
+int32_t colorFormatOf(const std::string& name) {
+    if (name == "nv12") return KVUCMM::kColorFormatYUV420SemiPlanar;
+    if (name == "nv21") return KVUCMM::kColorFormatNV21;
+    if (name == "i420") return KVUCMM::kColorFormatYUV420Planar;
+    if (name == "yv12") return KVUCMM::kColorFormatYV12;
+    usageError("--format takes nv12, nv21, i420 or yv12");
+}
+
+void parseSize(const std::string& text, int* w, int* h) {
+    const size_t x = text.find('x');
+    if (x == std::string::npos) usageError("--size takes WxH, e.g. 1280x720");
+    *w = static_cast<int>(parseInt(text.substr(0, x), "--size"));
+    *h = static_cast<int>(parseInt(text.substr(x + 1), "--size"));
+    if (*w <= 0 || *h <= 0 || *w > 16384 || *h > 16384) usageError("--size out of range: " + text);
+}
+
+std::vector<uint8_t> readWhole(const std::string& path) {
+    const int fd = open(path.c_str(), O_RDONLY | O_CLOEXEC);
+    if (fd < 0) inputError(path + ": cannot open (" + strerror(errno) + ")");
+    struct stat st;
+    if (fstat(fd, &st) != 0 || !S_ISREG(st.st_mode) || st.st_size > (int64_t(1) << 30)) {
+        close(fd);
+        inputError(path + ": not a frame file");
+    }
+    std::vector<uint8_t> bytes(static_cast<size_t>(st.st_size));
+    size_t done = 0;
+    while (done < bytes.size()) {
+        const ssize_t n = read(fd, bytes.data() + done, bytes.size() - done);
+        if (n <= 0) break;
+        done += static_cast<size_t>(n);
+    }
+    close(fd);
+    if (done != bytes.size()) inputError(path + ": read error");
+    return bytes;
+}
+
+}  // namespace
+
+int runFrame(const std::vector<std::string>& words) {
+    Args args(words, {"--size", "--format", "--stride", "--slice-height", "--crop", "--range", "--standard", "-o",
+                      "--output"}, {});
+    args.expectPositional(1, "qnedit frame IN.yuv --size WxH --format F [...] -o OUT.png");
+    const std::string outPath = args.get("-o", args.get("--output"));
+    if (outPath.empty()) usageError("-o OUT.png is required");
+    if (!args.has("--size") || !args.has("--format")) usageError("--size and --format are required");
+    int width, height;
+    parseSize(args.get("--size"), &width, &height);
+    const int32_t colorFormat = colorFormatOf(args.get("--format"));
+    const int stride = static_cast<int>(args.getInt("--stride", width));
+    const int sliceHeight = static_cast<int>(args.getInt("--slice-height", height));
+    if (stride < width || sliceHeight < height) usageError("--stride and --slice-height must cover the picture");
+    int left = 0, top = 0, right = width - 1, bottom = height - 1;
+    if (args.has("--crop")) {
+        const std::vector<std::string> parts = splitList(args.get("--crop"));
+        if (parts.size() != 4) usageError("--crop takes L,T,R,B");
+        left = static_cast<int>(parseInt(parts[0], "--crop"));
+        top = static_cast<int>(parseInt(parts[1], "--crop"));
+        right = static_cast<int>(parseInt(parts[2], "--crop"));
+        bottom = static_cast<int>(parseInt(parts[3], "--crop"));
+        if (left < 0 || top < 0 || right < left || bottom < top || right >= width || bottom >= height) {
+            usageError("--crop must lie inside the picture");
+        }
+    }
+    const std::string range = args.get("--range", "limited");
+    if (range != "limited" && range != "full") usageError("--range takes limited or full");
+    const std::string standard = args.get("--standard", "bt601");
+    int32_t standardCode;
+    if (standard == "bt601") standardCode = ColorAspects::kColorStandardBT601_625;
+    else if (standard == "bt709") standardCode = ColorAspects::kColorStandardBT709;
+    else if (standard == "bt2020") standardCode = ColorAspects::kColorStandardBT2020;
+    else usageError("--standard takes bt601, bt709 or bt2020");
+
+    const std::string inPath = args.positional()[0];
+    const std::vector<uint8_t> frame = readWhole(inPath);
+    // A 4:2:0 frame: the luma plane and two quarter-size chroma planes.
+    const size_t need = size_t(stride) * sliceHeight + 2 * (size_t((stride + 1) / 2) * ((sliceHeight + 1) / 2));
+    if (frame.size() < need) {
+        inputError(inPath + ": " + std::to_string(frame.size()) + " bytes, a " + std::to_string(stride) + "x" +
+                   std::to_string(sliceHeight) + " 4:2:0 frame needs " + std::to_string(need));
+    }
+
+    sp<AMessage> format = new AMessage;
+    format->setInt32("width", width);
+    format->setInt32("height", height);
+    format->setInt32("stride", stride);
+    format->setInt32("slice-height", sliceHeight);
+    format->setRect("crop", left, top, right, bottom);
+    format->setInt32("color-format", colorFormat);
+    format->setInt32("color-range", range == "full" ? ColorAspects::kColorRangeFull : ColorAspects::kColorRangeLimited);
+    format->setInt32("color-standard", standardCode);
+    format->setInt32("color-transfer", ColorAspects::kColorTransferSMPTE_170M);
+
+    sp<QNMediaEditorColorUtils> colors = new QNMediaEditorColorUtils();
+    colors->setOutputFormat(format);
+    const int outW = right - left + 1, outH = bottom - top + 1;
+    std::vector<uint8_t> rgb(size_t(outW) * outH * 2);
+    const status_t err = colors->convert(frame.data(), rgb.data());
+    if (err != OK) inputError(inPath + ": the colour converter refused the frame (" + describeStatus(err) + ")");
+
+    OutputFile out(outPath);
+    std::string error;
+    if (!writePng(out.fd(), rgb565ToImage(rgb.data(), outW, outH), &error)) inputError(outPath + ": " + error);
+    out.commit();
+    fprintf(stderr, "%dx%d RGB 5:6:5 -> %s\n", outW, outH, outPath.c_str());
+    return kExitOk;
+}
+
+}  // namespace qnedit

@@ -1,0 +1,207 @@
+#include <algorithm>
+#include <cmath>
+#include <cstdlib>
+#include <deque>
+#include <vector>
+
+#include <media/stagefright/MediaDefs.h>
+#include <media/stagefright/foundation/ABuffer.h>
+
+#include "Cli.h"
+#include "Commands.h"
+#include "Input.h"
+#include "OutputFile.h"
+#include "Progress.h"
+#include "QNMediaAudioConverter.h"
+#include "QNMediaAudioEffect.h"
+#include "QNMediaEditorAdapter.h"
+#include "QNMediaMuxer.h"
+
+using namespace android;
+using namespace android::qnmediaeditor;
+
+namespace qnedit {
+
+const char* const kMixHelp =
+    "usage: qnedit mix MAIN BGM OUT [--main-gain DB] [--bgm-gain DB] [--mixer TYPE] [--offset MS]\n"
+    "\n"
+    "Mixes background audio (BGM) into the main recording. BGM is converted to\n"
+    "MAIN's sample format, rate and channel count first. Both must be PCM (WAV\n"
+    "or FLAC). OUT is WAV or FLAC, by its extension.\n"
+    "  --main-gain DB  gain of the main audio, -60..60 (default 0)\n"
+    "  --bgm-gain DB   gain of the background, -60..60 (default 0)\n"
+    "  --mixer TYPE    0 main only, 1 background only, 2 average, 3 background\n"
+    "                  over main, 4 sum (default), 5 main ducked under background\n"
+    "  --offset MS     when the background starts, relative to the main audio;\n"
+    "                  negative skips its beginning (default: the device setting)\n";
+
+namespace {
+
+struct PcmTrack {
+    size_t index = 0;
+    int32_t channels = 0, sampleRate = 0, bits = 16;
+    sp<AMessage> format;
+};
+
+PcmTrack findPcm(const Input& in) {
+    for (size_t i = 0; i < in.trackCount(); ++i) {
+        const sp<AMessage>& f = in.trackFormat(i);
+        if (Input::mimeOf(f) != MEDIA_MIMETYPE_AUDIO_RAW) continue;
+        PcmTrack t;
+        t.index = i;
+        t.format = f;
+        f->findInt32("channel-count", &t.channels);
+        f->findInt32("sample-rate", &t.sampleRate);
+        f->findInt32("bits-per-sample", &t.bits);
+        if (t.channels < 1 || t.channels > 2 || t.sampleRate <= 0 || (t.bits != 16 && t.bits != 24 && t.bits != 8)) {
+            inputError(in.path() + ": PCM must be mono or stereo, 8, 16 or 24 bit");
+        }
+        return t;
+    }
+    inputError(in.path() + ": no PCM audio track (use WAV or FLAC)");
+}
+
+// Background audio converted to the main format, handed out in the order it
+// was read; the start offset is applied here.
+class Background {
+public:
+    Background(Input& in, const PcmTrack& bgm, const PcmTrack& main, int64_t offsetMs)
+        : mIn(in), mFrameBytes(main.channels * (main.bits / 8)) {
+        mConverter = new QNMediaAudioConverter();
+        if (!mConverter->init(bgm.sampleRate, bgm.channels, bgm.bits, main.sampleRate, main.channels, main.bits)) {
+            inputError(in.path() + ": the background cannot be converted");
+        }
+        in.wrapper().selectTrack(bgm.index);
+        if (offsetMs > 0) {
+            mPending.assign(static_cast<size_t>(offsetMs * main.sampleRate / 1000) * mFrameBytes, 0);
+        } else if (offsetMs < 0) {
+            mSkipBytes = static_cast<int64_t>(-offsetMs * main.sampleRate / 1000) * mFrameBytes;
+        }
+    }
+    ~Background() {
+        if (mOut != nullptr) mConverter->freeBuff(mOut);
+    }
+
+    // Up to `bytes` bytes of converted background; fewer at its end.
+    std::vector<uint8_t> take(size_t bytes) {
+        while (mPending.size() < bytes && !mDone) refill();
+        const size_t n = std::min(bytes, mPending.size()) / mFrameBytes * mFrameBytes;
+        std::vector<uint8_t> chunk(mPending.begin(), mPending.begin() + n);
+        mPending.erase(mPending.begin(), mPending.begin() + n);
+        return chunk;
+    }
+
+private:
+    void append(const uint8_t* data, int size) {
+        if (size <= 0) return;
+        int64_t skip = std::min<int64_t>(mSkipBytes, size);
+        mSkipBytes -= skip;
+        mPending.insert(mPending.end(), data + skip, data + size);
+    }
+
+    void ensureOutput(int inputBytes) {
+        if (inputBytes <= mOutCapacityFor) return;
+        unsigned char* grown = mConverter->allocateBuff(mOut, inputBytes, 1.0f);
+        if (grown == nullptr) inputError(mIn.path() + ": out of memory");
+        mOut = grown;
+        mOutCapacityFor = inputBytes;
+    }
+
+    void refill() {
+        QNMediaExtractorWrapper& w = mIn.wrapper();
+        sp<ABuffer> buffer;
+        if (w.readSampleData(&buffer) != OK) {
+            // End of the background: drain what the resampler holds.
+            ensureOutput(65536);
+            for (int guard = 0; guard < 1 << 16; ++guard) {
+                const int made = mConverter->process(nullptr, mOut, 0);
+                if (made <= 0) break;
+                append(mOut, made);
+            }
+            mDone = true;
+            return;
+        }
+        w.advance();
+        ensureOutput(std::max<int>(static_cast<int>(buffer->size()), 65536));
+        const int made = mConverter->process(buffer->data(), mOut, static_cast<int>(buffer->size()));
+        if (made < 0) inputError(mIn.path() + ": background conversion failed");
+        append(mOut, made);
+    }
+
+    Input& mIn;
+    const size_t mFrameBytes;
+    sp<QNMediaAudioConverter> mConverter;
+    unsigned char* mOut = nullptr;
+    int mOutCapacityFor = 0;
+    std::deque<uint8_t> mPending;
+    int64_t mSkipBytes = 0;
+    bool mDone = false;
+};
+
+}  // namespace
+
+int runMix(const std::vector<std::string>& words) {
+    Args args(words, {"--main-gain", "--bgm-gain", "--mixer", "--offset"}, {});
+    args.expectPositional(3, "qnedit mix MAIN BGM OUT [--main-gain DB] [--bgm-gain DB] [--mixer TYPE] [--offset MS]");
+    const std::string outPath = args.positional()[2];
+    const std::string ext = lowerExtension(outPath);
+    if (ext != "wav" && ext != "flac") usageError("OUT must end in .wav or .flac");
+    const long mainGain = args.getInt("--main-gain", 0), bgmGain = args.getInt("--bgm-gain", 0);
+    const long mixer = args.getInt("--mixer", 4);
+    if (mixer < 0 || mixer > 5) usageError("--mixer takes 0 to 5");
+    int offsetMs = 0;
+    if (args.has("--offset")) {
+        offsetMs = static_cast<int>(args.getInt("--offset", 0));
+    } else {
+        Adapter::GetBGMSyncFromKestro(&offsetMs);
+    }
+    int ditherType = 0;
+    const bool haveDither = Adapter::GetUseDitherTypeFromKestro(&ditherType);
+
+    Input mainIn(args.positional()[0]);
+    Input bgmIn(args.positional()[1]);
+    const PcmTrack main = findPcm(mainIn);
+    const PcmTrack bgm = findPcm(bgmIn);
+
+    sp<QNMediaAudioEffect> effect = new QNMediaAudioEffect();
+    effect->setParamAudioInfo(main.bits, main.sampleRate, main.channels);
+    effect->setParamAuxInfo(main.bits, main.sampleRate, main.channels);
+    effect->setParamChainType(static_cast<int>(mainGain), static_cast<int>(bgmGain), 0, static_cast<int>(mixer));
+    Background background(bgmIn, bgm, main, offsetMs);
+
+    OutputFile out(outPath);
+    sp<QNMediaMuxer> muxer = new QNMediaMuxer(out.fd(), ext == "wav" ? OUTPUT_FILE_FORMAT_WAVE : OUTPUT_FILE_FORMAT_FLAC);
+    const ssize_t track = muxer->addTrack(main.format->dup());
+    if (track < 0) inputError(outPath + ": the writer refused the audio format");
+    if (muxer->start() != OK) inputError(outPath + ": cannot start writing");
+
+    QNMediaExtractorWrapper& w = mainIn.wrapper();
+    w.selectTrack(main.index);
+    Progress progress("mix", mainIn.durationUs());
+    int64_t time = 0;
+    while (w.getSampleTime(&time) == OK) {
+        sp<ABuffer> buffer;
+        const status_t err = w.readSampleData(&buffer);
+        if (err != OK) inputError(mainIn.path() + ": " + describeStatus(err));
+        std::vector<uint8_t> aux = background.take(buffer->size());
+        if (!aux.empty() && effect->writeAux(aux.data(), static_cast<int>(aux.size())) < 0) {
+            inputError("the mixer could not take the background audio");
+        }
+        const int mixed = effect->processEffectChain(buffer->data(), buffer->data(), static_cast<int>(buffer->size()));
+        if (mixed < 0) inputError("the mixer failed");
+        buffer->setRange(buffer->offset(), std::min<size_t>(buffer->size(), static_cast<size_t>(mixed)));
+        if (muxer->writeSampleData(0, buffer, static_cast<size_t>(track), time, 1) != OK) inputError(outPath + ": write failed");
+        progress.update(time);
+        if (w.advance() != OK) break;
+    }
+    progress.finish();
+    const status_t stopErr = muxer->stop();
+    muxer.clear();
+    if (stopErr != OK) inputError(outPath + ": could not be completed (" + describeStatus(stopErr) + ")");
+    out.commit();
+    fprintf(stderr, "mixed with offset %d ms, mixer %ld%s -> %s\n", offsetMs, mixer,
+            haveDither ? (", dither type " + std::to_string(ditherType)).c_str() : "", outPath.c_str());
+    return kExitOk;
+}
+
+}  // namespace qnedit

@@ -105,9 +105,9 @@ int runFrame(const std::vector<std::string>& words) {
     if (range != "limited" && range != "full") usageError("--range takes limited or full");
     const std::string standard = args.get("--standard", "bt601");
     int32_t standardCode;
-    if (standard == "bt601") standardCode = ColorAspects::kColorStandardBT601_625;
-    else if (standard == "bt709") standardCode = ColorAspects::kColorStandardBT709;
-    else if (standard == "bt2020") standardCode = ColorAspects::kColorStandardBT2020;
+    if (standard == "bt601") standardCode = ColorUtils::kColorStandardBT601_625;
+    else if (standard == "bt709") standardCode = ColorUtils::kColorStandardBT709;
+    else if (standard == "bt2020") standardCode = ColorUtils::kColorStandardBT2020;
     else usageError("--standard takes bt601, bt709 or bt2020");
 
     const std::string inPath = args.positional()[0];
@@ -126,9 +126,9 @@ int runFrame(const std::vector<std::string>& words) {
     format->setInt32("slice-height", sliceHeight);
     format->setRect("crop", left, top, right, bottom);
     format->setInt32("color-format", colorFormat);
-    format->setInt32("color-range", range == "full" ? ColorAspects::kColorRangeFull : ColorAspects::kColorRangeLimited);
+    format->setInt32("color-range", range == "full" ? ColorUtils::kColorRangeFull : ColorUtils::kColorRangeLimited);
     format->setInt32("color-standard", standardCode);
-    format->setInt32("color-transfer", ColorAspects::kColorTransferSMPTE_170M);
+    format->setInt32("color-transfer", ColorUtils::kColorTransferSMPTE_170M);
 
     sp<QNMediaEditorColorUtils> colors = new QNMediaEditorColorUtils();
     colors->setOutputFormat(format);

@@ -11,7 +11,10 @@ ff() { ffmpeg -hide_banner -loglevel error -y "$@"; }
 ff -f lavfi -i testsrc2=size=640x360:rate=25:duration=8 \
    -f lavfi -i "sine=frequency=440:sample_rate=44100:duration=8" \
    -c:v libx264 -preset veryfast -crf 32 -g 50 -bf 2 -pix_fmt yuv420p \
-   -c:a aac -b:a 64k -ac 2 -metadata:s:v:0 rotate=90 -movflags +faststart "$out/clip.mp4"
+   -c:a aac -b:a 64k -ac 2 "$out/clip.tmp.mp4"
+# The rotation tag is taken on a stream copy.
+ff -i "$out/clip.tmp.mp4" -map 0 -c copy -metadata:s:v:0 rotate=90 -movflags +faststart "$out/clip.mp4"
+rm -f "$out/clip.tmp.mp4"
 
 # 8 s of a rising chord as 16-bit stereo FLAC with a fixed block size.
 ff -f lavfi -i "aevalsrc=0.3*sin(2*PI*(220+40*t)*t)+0.2*sin(2*PI*330*t)*(0.5+0.5*sin(2*PI*0.5*t))|0.3*sin(2*PI*(221+40*t)*t):s=44100:d=8" \

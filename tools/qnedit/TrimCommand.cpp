@@ -247,6 +247,7 @@ int runTrim(const std::vector<std::string>& words) {
         bool keep = true;
         if (t.pcm && (plan.format == "wav" || plan.format == "flac")) keep = cutPcm(t, timeUs, originUs, endUs, buffer, &writeTimeUs);
         if (t.flac != nullptr) {
+            buffer->meta()->setInt64("timeUs", timeUs);
             sp<ABuffer> converted;
             if (!t.flac->convert(buffer, &converted)) inputError(inPath + ": unreadable FLAC frame at " + std::to_string(timeUs / 1e6) + " s");
             buffer = converted;

@@ -1,0 +1,93 @@
+#!/usr/bin/env bash
+# The editor as a user runs it: every subcommand on the sample media, the
+# results checked with ffprobe, ffmpeg and the flac tool, and bad input and
+# bad usage answered with one line and the right exit status.
+set -u
+qnedit=$1
+samples=$2
+work=$(mktemp -d)
+trap 'rm -rf "$work"' EXIT
+pass=0
+fail=0
+check() {  # check NAME COMMAND...
+  local name=$1; shift
+  if "$@" >"$work/last.log" 2>&1; then pass=$((pass + 1)); else fail=$((fail + 1)); echo "FAIL: $name"; cat "$work/last.log"; fi
+}
+expect_status() {  # expect_status STATUS COMMAND...
+  local want=$1; shift
+  "$@" >"$work/out.txt" 2>"$work/err.txt"
+  local got=$?
+  [ "$got" -eq "$want" ] || { echo "exit $got, wanted $want"; cat "$work/err.txt"; return 1; }
+  [ "$(wc -l <"$work/err.txt")" -le 1 ] || { echo "more than one error line:"; cat "$work/err.txt"; return 1; }
+}
+have() { command -v "$1" >/dev/null; }
+duration() { ffprobe -v error -show_entries format=duration -of csv=p=0 "$1"; }
+near() { awk -v a="$1" -v b="$2" -v e="$3" 'BEGIN { d = a - b; if (d < 0) d = -d; exit !(d <= e) }'; }
+
+# probe
+check "probe text" "$qnedit" --quiet probe "$samples/clip.mp4"
+check "probe json names both tracks" bash -c "'$qnedit' probe --json '$samples/clip.mp4' | python3 -c '
+import json, sys
+j = json.load(sys.stdin)
+assert [t[\"codec\"] for t in j[\"tracks\"]] == [\"h264\", \"aac\"], j
+assert j[\"tracks\"][0][\"samples\"] == 200 and j[\"tracks\"][0][\"syncSamples\"] == 4, j
+assert j[\"device\"][\"orientation\"] == 270, j
+'"
+
+# trim MP4: presentation starts at --start and lasts to --end, pre-roll hidden
+check "trim mp4" "$qnedit" --quiet trim "$samples/clip.mp4" "$work/cut.mp4" --start 2.5 --end 6
+if have ffprobe; then
+  check "trimmed mp4 lasts 3.5 s" near "$(duration "$work/cut.mp4")" 3.5 0.05
+  check "trimmed mp4 starts at 0" bash -c "ffprobe -v error -show_entries stream=start_time -of csv=p=0 '$work/cut.mp4' | awk '{ if (\$1 + 0 != 0) exit 1 }'"
+  check "trimmed mp4 decodes" ffmpeg -v error -i "$work/cut.mp4" -f null -
+  check "rotation kept" bash -c "ffprobe -v error -show_streams '$work/cut.mp4' | grep -q rotation=90"
+fi
+check "trim mp4 from the key frame" "$qnedit" --quiet trim "$samples/clip.mp4" "$work/key.mp4" --start 2.5 --end 6 --keyframe
+have ffprobe && check "key-frame trim is longer" bash -c "awk -v d=\$(ffprobe -v error -show_entries format=duration -of csv=p=0 '$work/key.mp4') 'BEGIN { exit !(d > 3.5) }'"
+check "audio only into m4a" "$qnedit" --quiet trim "$samples/clip.mp4" "$work/cut.m4a" --start 1 --end 3
+have ffprobe && check "m4a holds aac only" bash -c "[ \"\$(ffprobe -v error -show_entries stream=codec_name -of csv=p=0 '$work/cut.m4a')\" = aac ]"
+
+# trim FLAC through the frame converter
+check "trim flac" "$qnedit" --quiet trim "$samples/voice.flac" "$work/cut.flac" --start 1.2 --end 5
+have flac && check "trimmed flac passes flac -t" flac --test --silent "$work/cut.flac"
+# trim WAV exactly
+check "trim wav" "$qnedit" --quiet trim "$samples/music.wav" "$work/cut.wav" --start 1 --end 2.5
+have ffprobe && check "trimmed wav lasts 1.5 s" near "$(duration "$work/cut.wav")" 1.5 0.001
+
+# waveform
+check "waveform json" bash -c "'$qnedit' waveform '$samples/voice.flac' | python3 -c '
+import json, sys
+j = json.load(sys.stdin)
+assert j[\"intervalUs\"] == 20000 and j[\"count\"] == 400 == len(j[\"values\"]), j[\"count\"]
+'"
+check "waveform png" "$qnedit" waveform "$samples/voice.flac" -o "$work/w.png"
+check "png signature" bash -c "head -c 8 '$work/w.png' | od -An -tx1 | grep -q '89 50 4e 47'"
+
+# mix
+check "mix" "$qnedit" --quiet mix "$samples/voice.flac" "$samples/music.wav" "$work/mix.flac" --bgm-gain -6 --offset 500
+have flac && check "mixed flac passes flac -t" flac --test --silent "$work/mix.flac"
+have ffprobe && check "mix keeps the main length" near "$(duration "$work/mix.flac")" 8 0.01
+
+# frame
+check "frame" "$qnedit" frame "$samples/frame_320x240.nv12" --size 320x240 --format nv12 -o "$work/f.png"
+check "cropped frame" "$qnedit" frame "$samples/frame_320x240.nv12" --size 320x240 --format nv12 --crop 10,10,169,129 --range full -o "$work/c.png"
+
+# bad input: status 1, one line, no output left behind
+head -c 5000 "$samples/clip.mp4" >"$work/broken.mp4"
+printf 'not media at all' >"$work/junk.bin"
+check "missing file" expect_status 1 "$qnedit" probe "$work/none.mp4"
+check "junk file" expect_status 1 "$qnedit" probe "$work/junk.bin"
+check "truncated input" expect_status 1 "$qnedit" trim "$work/broken.mp4" "$work/never.mp4" --start 1
+check "no half-written output" test ! -e "$work/never.mp4"
+check "short frame file" expect_status 1 "$qnedit" frame "$work/junk.bin" --size 320x240 --format nv12 -o "$work/never.png"
+check "no picture left" test ! -e "$work/never.png"
+check "start past the end" expect_status 1 "$qnedit" trim "$samples/music.wav" "$work/never.wav" --start 60
+# bad usage: status 2
+check "unknown command" expect_status 2 "$qnedit" cut a b
+check "missing --start" expect_status 2 "$qnedit" trim "$samples/clip.mp4" "$work/x.mp4"
+check "bad number" expect_status 2 "$qnedit" trim "$samples/clip.mp4" "$work/x.mp4" --start abc
+check "unknown option" expect_status 2 "$qnedit" probe --colour "$samples/clip.mp4"
+check "help" "$qnedit" trim --help
+
+echo "$pass passed, $fail failed"
+[ "$fail" -eq 0 ]

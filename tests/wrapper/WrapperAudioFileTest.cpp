@@ -10,7 +10,7 @@ using namespace wrappertest;
 
 TEST(WrapperAudioFileTest, PcmFilesReadBackWholeAndInOrder) {
     for (const char* name : {"u8_mono.wav", "s16_stereo.wav", "s24_mono.wav", "s24_ext_6ch.wav", "s32_stereo.wav",
-                             "f32_mono.wav"}) {
+                             "f32_mono.wav", "b4096.flac", "s24.flac"}) {
         SCOPED_TRACE(name);
         sp<QNMediaExtractorWrapper> wrapper = OpenWrapper(MediaPath(name));
         ASSERT_NE(nullptr, wrapper);
@@ -91,4 +91,53 @@ TEST(WrapperAudioFileTest, AmrFramesMatchThePacketList) {
         EXPECT_TRUE(wrapper->getTotalBitrate(&bitrate));
         EXPECT_GT(bitrate, 0);
     }
+}
+
+TEST(WrapperAudioFileTest, RawFlacFramesComeWithAStreamHeader) {
+    for (const char* name : {"b4096.flac", "b1152.flac"}) {
+        SCOPED_TRACE(name);
+        sp<QNMediaExtractorWrapper> wrapper = OpenWrapper(MediaPath(name));
+        ASSERT_NE(nullptr, wrapper);
+        ASSERT_EQ(OK, wrapper->setOutputFormatFlag(kEditorExtractorOutputFormat_FlacRaw));
+        ASSERT_EQ(OK, wrapper->setFlacRaw(true));
+        sp<AMessage> format;
+        ASSERT_EQ(OK, wrapper->getTrackFormat(0, &format));
+        sp<ABuffer> csd;
+        int32_t trim = 0, rate = 0;
+        ASSERT_TRUE(format->findBuffer("csd-0", &csd));
+        EXPECT_TRUE(format->findInt32("editor-flactrim", &trim) && trim == 1);
+        ASSERT_TRUE(format->findInt32("sample-rate", &rate));
+        // "fLaC" and STREAMINFO as stored, marked as the only metadata block.
+        std::vector<uint8_t> header = ReadFile(name);
+        header.resize(42);
+        header[4] = 0;
+        EXPECT_EQ(header, std::vector<uint8_t>(csd->data(), csd->data() + csd->size()));
+
+        ASSERT_EQ(OK, wrapper->selectTrack(0));
+        const std::vector<Delivered> frames = ReadAll(wrapper);
+        const std::vector<Packet> packets = Packets(name);
+        ASSERT_EQ(packets.size(), frames.size());
+        for (size_t i = 0; i < packets.size(); ++i) {
+            EXPECT_EQ(packets[i].size, frames[i].bytes.size()) << i;
+            EXPECT_EQ(packets[i].pts * 1000000 / rate, frames[i].timeUs) << i;
+        }
+    }
+}
+
+TEST(WrapperAudioFileTest, VorbisPacketsCarryTheirValidCountBehindThem) {
+    sp<QNMediaExtractorWrapper> wrapper = OpenWrapper(MediaPath("stereo.ogg"));
+    ASSERT_NE(nullptr, wrapper);
+    ASSERT_EQ(OK, wrapper->selectTrack(0));
+    const std::vector<Delivered> samples = ReadAll(wrapper);
+    const std::vector<Packet> packets = Packets("stereo.ogg");
+    ASSERT_EQ(packets.size(), samples.size());
+    int64_t kept = 0;
+    for (size_t i = 0; i < packets.size(); ++i) {
+        ASSERT_EQ(packets[i].size + 4, samples[i].bytes.size()) << i;
+        int32_t valid;
+        memcpy(&valid, samples[i].bytes.data() + packets[i].size, sizeof(valid));
+        kept += valid;
+    }
+    // The last granule position trims the stream to its frame count.
+    EXPECT_EQ(FactInt("stereo.ogg", "frames"), kept);
 }

@@ -1,20 +1,27 @@
 // Reads every sample of every track of an MP4 in presentation order, the way
-// the editor demuxes a recording. The input comes from make_bench_mp4.sh;
-// demux_bench.sh runs this beside ffmpeg on the same file.
+// the editor demuxes a recording: through the extractor wrapper, and through
+// the platform extractor alone for reference. The input comes from
+// make_bench_mp4.sh; demux_bench.sh runs this beside ffmpeg on the same file.
 
 #include <benchmark/benchmark.h>
 
+#include <fcntl.h>
 #include <sys/resource.h>
+#include <unistd.h>
 
 #include <cstdlib>
 #include <vector>
+
+#include <QNMediaExtractorWrapper.h>
 
 #include <media/stagefright/FileSource.h>
 #include <media/stagefright/MediaBufferBase.h>
 #include <media/stagefright/MediaErrors.h>
 #include <media/stagefright/MediaExtractorFactory.h>
+#include <media/stagefright/foundation/ABuffer.h>
 
 using namespace android;
+using android::qnmediaeditor::QNMediaExtractorWrapper;
 
 namespace {
 
@@ -36,7 +43,7 @@ bool Fill(Pending* p) {
 }
 
 // The earliest pending sample across the tracks goes first, one held per track.
-bool DemuxAll(const char* path, size_t* samples, size_t* bytes) {
+bool DemuxThroughExtractor(const char* path, size_t* samples, size_t* bytes) {
     sp<IMediaExtractor> extractor = MediaExtractorFactory::Create(new FileSource(path), nullptr);
     if (extractor == nullptr) return false;
     std::vector<Pending> tracks(extractor->countTracks());
@@ -61,11 +68,37 @@ bool DemuxAll(const char* path, size_t* samples, size_t* bytes) {
     return true;
 }
 
+// As the editor does: every track selected, each sample copied into one
+// reused buffer that grows when a sample does not fit.
+bool DemuxThroughWrapper(const char* path, size_t* samples, size_t* bytes) {
+    const int fd = open(path, O_RDONLY | O_CLOEXEC);
+    if (fd < 0) return false;
+    sp<QNMediaExtractorWrapper> wrapper = new QNMediaExtractorWrapper;
+    const status_t err = wrapper->setDataSource(fd, 0, lseek(fd, 0, SEEK_END));
+    close(fd);
+    if (err != OK) return false;
+    for (size_t i = 0; i < wrapper->countTracks(); ++i) wrapper->selectTrack(i);
+    sp<ABuffer> buffer = new ABuffer(1 << 20);
+    while (true) {
+        status_t read = wrapper->readSampleData(buffer);
+        if (read == NO_MEMORY) {
+            buffer = new ABuffer(buffer->capacity() * 2);
+            continue;
+        }
+        if (read != OK) break;
+        ++*samples;
+        *bytes += buffer->size();
+        wrapper->advance();
+    }
+    return true;
+}
+
+template <bool (*Demux)(const char*, size_t*, size_t*)>
 void BM_DemuxEverySample(benchmark::State& state) {
     size_t samples = 0, bytes = 0;
     for (auto _ : state) {
         samples = bytes = 0;
-        if (!DemuxAll(BenchFile(), &samples, &bytes)) {
+        if (!Demux(BenchFile(), &samples, &bytes)) {
             state.SkipWithError("no readable input: run bench/make_bench_mp4.sh first");
             return;
         }
@@ -76,7 +109,8 @@ void BM_DemuxEverySample(benchmark::State& state) {
     state.counters["peak_rss_mb"] = usage.ru_maxrss / 1024.0;
     state.SetBytesProcessed(int64_t(bytes) * state.iterations());
 }
-BENCHMARK(BM_DemuxEverySample)->Unit(benchmark::kMillisecond)->UseRealTime();
+BENCHMARK_TEMPLATE(BM_DemuxEverySample, DemuxThroughWrapper)->Name("Wrapper")->Unit(benchmark::kMillisecond)->UseRealTime();
+BENCHMARK_TEMPLATE(BM_DemuxEverySample, DemuxThroughExtractor)->Name("Extractor")->Unit(benchmark::kMillisecond)->UseRealTime();
 
 }  // namespace
 

@@ -21,10 +21,13 @@ json=$(mktemp)
 trap 'rm -f "$json"' EXIT
 mem=$( { DEMUX_BENCH_FILE="$file" /usr/bin/time -f "%M" "$build/bin/DemuxBench" --benchmark_repetitions=$runs \
           --benchmark_format=json --benchmark_out="$json" >/dev/null; } 2>&1 | tail -1)
-ours_ms=$(jq '[.benchmarks[] | select(.run_type == "iteration") | .real_time] | min' "$json")
+best_ms() { jq "[.benchmarks[] | select(.run_type == \"iteration\" and (.run_name | startswith(\"$1\"))) | .real_time] | min" "$json"; }
+wrapper_ms=$(best_ms Wrapper)
+extractor_ms=$(best_ms Extractor)
 samples=$(jq '.benchmarks[0].samples' "$json")
 
 echo "file: $file ($(stat -c %s "$file") bytes, $samples samples)"
 echo "ffmpeg -c copy: best of $runs ${ff_s} s, peak RSS $((ff_kb / 1024)) MB"
-echo "extractor:      best of $runs $(jq -n "$ours_ms | round / 1000") s, peak RSS $((mem / 1024)) MB"
-echo "time ratio (extractor / ffmpeg): $(jq -n "$ours_ms / 1000 / $ff_s * 1000 | round / 1000")"
+echo "wrapper:        best of $runs $(jq -n "$wrapper_ms | round / 1000") s (extractor alone $(jq -n "$extractor_ms | round / 1000") s), peak RSS $((mem / 1024)) MB"
+echo "time ratio (wrapper / ffmpeg): $(jq -n "$wrapper_ms / 1000 / $ff_s * 1000 | round / 1000")"
+echo "memory ratio (wrapper / ffmpeg): $(jq -n "$mem / $ff_kb * 1000 | round / 1000")"

@@ -10,6 +10,7 @@
 #include "Cli.h"
 #include "Commands.h"
 #include "Input.h"
+#include "MuxerOutput.h"
 #include "OutputFile.h"
 #include "Progress.h"
 #include "QNMediaAudioConverter.h"
@@ -195,10 +196,7 @@ int runMix(const std::vector<std::string>& words) {
         if (w.advance() != OK) break;
     }
     progress.finish();
-    const status_t stopErr = muxer->stop();
-    muxer.clear();
-    if (stopErr != OK) inputError(outPath + ": could not be completed (" + describeStatus(stopErr) + ")");
-    out.commit();
+    finishOutput(muxer, out);
     fprintf(stderr, "mixed with offset %d ms, mixer %ld%s -> %s\n", offsetMs, mixer,
             haveDither ? (", dither type " + std::to_string(ditherType)).c_str() : "", outPath.c_str());
     return kExitOk;

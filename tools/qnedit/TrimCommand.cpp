@@ -12,6 +12,7 @@
 #include "Commands.h"
 #include "DeviceItems.h"
 #include "Input.h"
+#include "MuxerOutput.h"
 #include "OutputFile.h"
 #include "Progress.h"
 #include "QNMediaFlacFrameConverter.h"
@@ -260,10 +261,7 @@ int runTrim(const std::vector<std::string>& words) {
         if (w.advance() != OK) break;
     }
     progress.finish();
-    const status_t stopErr = muxer->stop();
-    muxer.clear();
-    if (stopErr != OK) inputError(outPath + ": could not be completed (" + describeStatus(stopErr) + ")");
-    out.commit();
+    finishOutput(muxer, out);
     return kExitOk;
 }
 

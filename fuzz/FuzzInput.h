@@ -14,7 +14,14 @@ class FuzzInput {
 public:
     FuzzInput(const uint8_t* data, size_t size) : mData(data), mSize(size) {}
     uint8_t u8() { return mPos < mSize ? mData[mPos++] : 0; }
-    uint32_t u32() { return u8() | (u8() << 8) | (u8() << 16) | (uint32_t(u8()) << 24); }
+    // Little-endian; one statement per byte keeps the order of the reads fixed.
+    uint32_t u32() {
+        uint32_t v = u8();
+        v |= uint32_t(u8()) << 8;
+        v |= uint32_t(u8()) << 16;
+        v |= uint32_t(u8()) << 24;
+        return v;
+    }
     // The next n bytes (fewer at the end).
     const uint8_t* take(size_t n, size_t* got) {
         *got = n < mSize - mPos ? n : mSize - mPos;

@@ -1,9 +1,12 @@
 #!/usr/bin/env bash
 # Installs the Debian packages the build, the tests and the demo need, when missing.
+#   --fuzz  also the clang toolchain and sanitizer runtimes that scripts/fuzz.sh needs
 set -euo pipefail
 packages=(cmake g++ make pkg-config git libgtest-dev libgmock-dev libbenchmark-dev
           libflac-dev libogg-dev libvorbis-dev libsoxr-dev libyuv-dev libpng-dev
           ffmpeg flac sox libsox-fmt-all python3)
+fuzz_packages=(clang libclang-rt-dev)
+[ "${1:-}" = "--fuzz" ] && packages+=("${fuzz_packages[@]}")
 missing=()
 for p in "${packages[@]}"; do
   dpkg-query -W -f='${Status}' "$p" 2>/dev/null | grep -q "install ok installed" || missing+=("$p")

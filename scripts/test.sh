@@ -1,19 +1,71 @@
 #!/usr/bin/env bash
-# Builds the project and runs the whole test suite, then runs it again under
-# AddressSanitizer + UndefinedBehaviorSanitizer.
-set -euo pipefail
+# Builds the project and runs the whole test suite, then the suite again under
+# AddressSanitizer + UndefinedBehaviorSanitizer, the thread tests under
+# ThreadSanitizer, and every fuzz target for a bounded time.
+#   SKIP_SANITIZERS=1  skip the ASan/UBSan and TSan steps
+#   SKIP_FUZZ=1        skip the fuzzing step
+#   FUZZ_SECONDS       time per fuzz target (default 45)
+# Every step runs even when an earlier one failed; the exit status is non-zero
+# when any failed.
+set -uo pipefail
 root=$(cd "$(dirname "$0")/.." && pwd)
-"$root/scripts/deps.sh"
 jobs=$(nproc)
+failed=()
+times=()
 
-cmake -S "$root" -B "$root/build" -DCMAKE_BUILD_TYPE=RelWithDebInfo >/dev/null
-cmake --build "$root/build" -j"$jobs"
-(cd "$root/build" && ctest --output-on-failure -j"$jobs")
+step() {
+  local name=$1; shift
+  local start=$SECONDS
+  echo "=== $name"
+  if "$@"; then
+    times+=("$(printf '%-12s %5ds ok' "$name" $((SECONDS - start)))")
+  else
+    times+=("$(printf '%-12s %5ds FAILED' "$name" $((SECONDS - start)))")
+    failed+=("$name")
+  fi
+}
 
+plain() {
+  cmake -S "$root" -B "$root/build" -DCMAKE_BUILD_TYPE=RelWithDebInfo >/dev/null &&
+  cmake --build "$root/build" -j"$jobs" &&
+  (cd "$root/build" && ctest --output-on-failure -j"$jobs")
+}
+
+# Sanitizer builds: tests only, -O1 so that the suite runs in reasonable time.
+sanitized() {
+  local dir=$1 sanitizers=$2
+  cmake -S "$root" -B "$root/$dir" -DCMAKE_BUILD_TYPE=Debug -DCMAKE_CXX_FLAGS_DEBUG="-O1 -g" \
+        -DCMAKE_C_FLAGS_DEBUG="-O1 -g" -DMEDIAEDITOR_SANITIZE="$sanitizers" \
+        -DMEDIAEDITOR_BUILD_BENCH=OFF -DMEDIAEDITOR_BUILD_TOOLS=OFF >/dev/null &&
+  cmake --build "$root/$dir" -j"$jobs" --target mediaeditor_tests
+}
+
+asan() {
+  sanitized build-asan address,undefined &&
+  (cd "$root/build-asan" && ASAN_OPTIONS=detect_leaks=1:abort_on_error=1 \
+     UBSAN_OPTIONS=print_stacktrace=1:halt_on_error=1 ctest --output-on-failure -j"$jobs")
+}
+
+# The thread tests are the suites named *Concurrency* or *Stress*.
+tsan() {
+  sanitized build-tsan thread &&
+  (cd "$root/build-tsan" && TSAN_OPTIONS=halt_on_error=1:second_deadlock_stack=1 \
+     ctest --output-on-failure -j"$jobs" --no-tests=error -R 'Concurrency|Stress')
+}
+
+step deps "$root/scripts/deps.sh"
+step build+test plain
 if [ "${SKIP_SANITIZERS:-0}" != "1" ]; then
-  cmake -S "$root" -B "$root/build-asan" -DCMAKE_BUILD_TYPE=Debug -DMEDIAEDITOR_SANITIZE=address,undefined \
-        -DMEDIAEDITOR_BUILD_BENCH=OFF -DMEDIAEDITOR_BUILD_TOOLS=OFF >/dev/null
-  cmake --build "$root/build-asan" -j"$jobs"
-  (cd "$root/build-asan" && ASAN_OPTIONS=detect_leaks=1 UBSAN_OPTIONS=print_stacktrace=1 \
-     ctest --output-on-failure -j"$jobs")
+  step asan+ubsan asan
+  step tsan tsan
+fi
+if [ "${SKIP_FUZZ:-0}" != "1" ]; then
+  step fuzz env FUZZ_SECONDS="${FUZZ_SECONDS:-45}" "$root/scripts/fuzz.sh"
+fi
+
+echo "=== step times"
+printf '%s\n' "${times[@]}"
+if [ ${#failed[@]} -gt 0 ]; then
+  echo "FAILED: ${failed[*]}"
+  exit 1
 fi

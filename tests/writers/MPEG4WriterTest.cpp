@@ -42,7 +42,9 @@ class MPEG4WriterFileTest : public ::testing::Test {
 protected:
     static void SetUpTestSuite() {
         if (!haveTool("ffmpeg") || !haveTool("ffprobe")) return;
-        sDir = ::testing::TempDir() + "mp4w_sources";
+        // One directory per process: ctest runs each test in its own process,
+        // side by side, and a shared one would be rewritten under a reader.
+        sDir = ::testing::TempDir() + "mp4w_sources_" + std::to_string(getpid());
         runCommand("mkdir -p '" + sDir + "'");
         const std::string common = "ffmpeg -nostdin -v error -y -f lavfi -i testsrc=size=160x120:rate=30 ";
         sHaveSources =
@@ -50,6 +52,10 @@ protected:
                                 "-c:v libx264 -bf 2 -x264-params b-adapt=0 -g 15 -c:a aac -b:a 64k '" + sDir + "/avc.mp4'") == 0 &&
             runCommand(common + "-t 1 -pix_fmt yuv420p -c:v libx265 -x265-params log-level=none:bframes=2:b-adapt=0 "
                                 "-tag:v hvc1 '" + sDir + "/hevc.mp4'") == 0;
+    }
+
+    static void TearDownTestSuite() {
+        if (!sDir.empty()) runCommand("rm -rf '" + sDir + "'");
     }
 
     void SetUp() override {

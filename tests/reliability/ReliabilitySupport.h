@@ -1,0 +1,50 @@
+#ifndef TESTS_RELIABILITY_SUPPORT_H
+#define TESTS_RELIABILITY_SUPPORT_H
+
+#include <dirent.h>
+
+#include <algorithm>
+#include <fstream>
+#include <iterator>
+#include <string>
+#include <vector>
+
+#include <log/log.h>
+
+namespace reliability {
+
+using Bytes = std::vector<uint8_t>;
+
+// Drops every log line while alive: thousands of refusals say nothing here.
+class QuietLogs {
+public:
+    QuietLogs() { mPrevious = android::setLogSink([](int, const char*, const char*) {}); }
+    ~QuietLogs() { android::setLogSink(mPrevious); }
+
+private:
+    android::LogSink mPrevious;
+};
+
+inline Bytes readFile(const std::string& path) {
+    std::ifstream in(path, std::ios::binary);
+    return Bytes(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
+}
+
+// Names in a directory (no dot files), sorted; empty when it does not exist.
+inline std::vector<std::string> listDir(const std::string& dir) {
+    std::vector<std::string> names;
+    if (DIR* d = opendir(dir.c_str())) {
+        while (dirent* e = readdir(d)) {
+            if (e->d_name[0] != '.') names.push_back(e->d_name);
+        }
+        closedir(d);
+    }
+    std::sort(names.begin(), names.end());
+    return names;
+}
+
+inline std::string regressionsDir() { return std::string(ME_TEST_MEDIA_DIR) + "/../fuzz-regressions"; }
+
+}  // namespace reliability
+
+#endif

@@ -29,9 +29,11 @@ run_one() {
   mkdir -p "$corpus" "$seeds/$name"
   local dirs=("$corpus" "$seeds/$name")
   [ -d "$regressions" ] && dirs+=("$regressions")
+  local extra=()
+  [ -f "$root/fuzz/$name.dict" ] && extra+=("-dict=$root/fuzz/$name.dict")
   # Leak checks stay on: a leak in a parser is a finding like any other.
   ASAN_OPTIONS=detect_leaks=1:allocator_may_return_null=1 UBSAN_OPTIONS=print_stacktrace=1 \
-    "$build/bin/$name" "${dirs[@]}" -max_total_time="$seconds" -timeout=10 -rss_limit_mb=2048 \
+    "$build/bin/$name" "${dirs[@]}" "${extra[@]}" -max_total_time="$seconds" -timeout=10 -rss_limit_mb=2048 \
       -malloc_limit_mb=1024 -max_len=262144 -print_final_stats=1 \
       -artifact_prefix="$build/findings/$name-" >"$build/$name.log" 2>&1
 }

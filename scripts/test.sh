@@ -4,7 +4,7 @@
 # ThreadSanitizer, and every fuzz target for a bounded time.
 #   SKIP_SANITIZERS=1  skip the ASan/UBSan and TSan steps
 #   SKIP_FUZZ=1        skip the fuzzing step
-#   FUZZ_SECONDS       time per fuzz target (default 45)
+#   FUZZ_SECONDS       time per fuzz target (default 60)
 # Every step runs even when an earlier one failed; the exit status is non-zero
 # when any failed.
 set -uo pipefail
@@ -46,11 +46,12 @@ asan() {
      UBSAN_OPTIONS=print_stacktrace=1:halt_on_error=1 ctest --output-on-failure -j"$jobs")
 }
 
-# The thread tests are the suites named *Concurrency* or *Stress*.
+# The thread tests are the suites named *Concurrency* or *Stress*; they are
+# short, so each runs a few times to meet more interleavings.
 tsan() {
   sanitized build-tsan thread &&
   (cd "$root/build-tsan" && TSAN_OPTIONS=halt_on_error=1:second_deadlock_stack=1 \
-     ctest --output-on-failure -j"$jobs" --no-tests=error -R 'Concurrency|Stress')
+     ctest --output-on-failure -j"$jobs" --no-tests=error -R 'Concurrency|Stress' --repeat until-fail:5)
 }
 
 step deps "$root/scripts/deps.sh"
@@ -60,7 +61,7 @@ if [ "${SKIP_SANITIZERS:-0}" != "1" ]; then
   step tsan tsan
 fi
 if [ "${SKIP_FUZZ:-0}" != "1" ]; then
-  step fuzz env FUZZ_SECONDS="${FUZZ_SECONDS:-45}" "$root/scripts/fuzz.sh"
+  step fuzz env FUZZ_SECONDS="${FUZZ_SECONDS:-60}" "$root/scripts/fuzz.sh"
 fi
 
 echo "=== step times"

@@ -107,7 +107,7 @@ TEST(KestroTest, ValuesStayPutUntilTheyChange) {
     EXPECT_EQ(nullptr, info->getFeatureValue(kSection, "b"));
 }
 
-TEST(KestroTest, ConcurrentReadersAndWriters) {
+TEST(KestroConcurrencyTest, ReadersAndWriters) {
     SettingsFile file("[NewFeatures]\nstable = yes\n");
     Kestro* store = Kestro::getInstance();
     store->setSettingsPath(file.path().c_str());

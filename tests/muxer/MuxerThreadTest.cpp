@@ -19,7 +19,7 @@ using Access = android::qnmediaeditor::QNMediaMuxerTestAccess;
 
 namespace {
 
-TEST(MuxerThreadTest, ForcedStopDuringTwoWritersLosesNothingPushedBeforeIt) {
+TEST(MuxerConcurrencyTest, ForcedStopDuringTwoWritersLosesNothingPushedBeforeIt) {
     constexpr int kSamples = 3000;
     sp<RecordingWriter> writer = new RecordingWriter(/*pull=*/true);
     writer->slowTrack = 0;  // its queue fills, so its pushes block under the muxer lock

@@ -101,7 +101,7 @@ TEST(CheckDeathTest, MessagesNameTheConditionAndValues) {
     EXPECT_DEATH(CHECK_AT("some/fixed/Path", 169, 2 < 1), "some/fixed/Path:169 CHECK\\(2 < 1\\) failed\\.");
 }
 
-TEST(MediaAdapterTest, BuffersPushedBeforeStopAreAllDeliveredThenEndOfStream) {
+TEST(MediaAdapterConcurrencyTest, BuffersPushedBeforeStopAreAllDeliveredThenEndOfStream) {
     sp<MediaAdapter> adapter = new MediaAdapter(new MetaData, 4);
     adapter->start();
     std::thread producer([&] {

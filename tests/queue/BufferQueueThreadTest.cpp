@@ -62,7 +62,7 @@ status_t readOne(const sp<QNMediaEditorBufferQueue>& q) {
     return err;
 }
 
-TEST(BufferQueueThreadTest, ReadBlocksUntilAUnitIsQueued) {
+TEST(BufferQueueConcurrencyTest, ReadBlocksUntilAUnitIsQueued) {
     sp<QNMediaEditorBufferQueue> queue = new QNMediaEditorBufferQueue(nullptr);
     int64_t seen = -1;
     Consumers c;
@@ -82,7 +82,7 @@ TEST(BufferQueueThreadTest, ReadBlocksUntilAUnitIsQueued) {
     EXPECT_EQ(777, seen);
 }
 
-TEST(BufferQueueThreadTest, ClearReopensTheStreamSoReadsBlockAgain) {
+TEST(BufferQueueConcurrencyTest, ClearReopensTheStreamSoReadsBlockAgain) {
     sp<QNMediaEditorBufferQueue> queue = new QNMediaEditorBufferQueue(nullptr);
     queue->signalEOS(ERROR_END_OF_STREAM);
     queue->clear();
@@ -93,7 +93,7 @@ TEST(BufferQueueThreadTest, ClearReopensTheStreamSoReadsBlockAgain) {
     EXPECT_EQ(ERROR_IO, results[0]);
 }
 
-TEST(BufferQueueThreadTest, EndOfStreamWakesEveryBlockedConsumer) {
+TEST(BufferQueueConcurrencyTest, EndOfStreamWakesEveryBlockedConsumer) {
     sp<QNMediaEditorBufferQueue> queue = new QNMediaEditorBufferQueue(nullptr);
     Consumers c;
     for (int i = 0; i < 2; ++i) {
@@ -112,7 +112,7 @@ TEST(BufferQueueThreadTest, EndOfStreamWakesEveryBlockedConsumer) {
     for (status_t r : results) EXPECT_EQ(ERROR_END_OF_STREAM, r);
 }
 
-TEST(BufferQueueThreadTest, PiecesOfOneUnitReachEveryBlockedPartialTaker) {
+TEST(BufferQueueConcurrencyTest, PiecesOfOneUnitReachEveryBlockedPartialTaker) {
     // A partial take leaves the unit queued, so the other takers must be woken
     // too even though only one unit was queued.
     sp<QNMediaEditorBufferQueue> queue = new QNMediaEditorBufferQueue(nullptr);
@@ -130,7 +130,7 @@ TEST(BufferQueueThreadTest, PiecesOfOneUnitReachEveryBlockedPartialTaker) {
     EXPECT_EQ(700u, queue->nextBufferSize());
 }
 
-TEST(BufferQueueThreadTest, ManyProducersAndConsumersDeliverEachUnitOnceInOrder) {
+TEST(BufferQueueConcurrencyTest, ManyProducersAndConsumersDeliverEachUnitOnceInOrder) {
     constexpr int kProducers = 3, kConsumers = 3, kUnits = 400;
     sp<QNMediaEditorBufferQueue> queue = new QNMediaEditorBufferQueue(nullptr);
     // The time encodes producer and sequence number.

@@ -43,6 +43,30 @@ inline std::vector<std::string> listDir(const std::string& dir) {
     return names;
 }
 
+struct SampleFile {
+    std::string name;
+    std::string path;
+    Bytes bytes;
+    bool flac;
+};
+
+// Every media file under tests/media, of every container the extractors know.
+inline std::vector<SampleFile> sampleFiles() {
+    std::vector<SampleFile> files;
+    for (const char* dir : {"audio", "mp4"}) {
+        const std::string path = std::string(ME_TEST_MEDIA_DIR) + "/" + dir;
+        for (const std::string& name : listDir(path)) {
+            const size_t dot = name.rfind('.');
+            const std::string ext = dot == std::string::npos ? "" : name.substr(dot);
+            if (ext == ".wav" || ext == ".flac" || ext == ".ogg" || ext == ".amr" || ext == ".awb" || ext == ".mp4" ||
+                ext == ".mov" || ext == ".m4a" || ext == ".3gp") {
+                files.push_back({name, path + "/" + name, readFile(path + "/" + name), ext == ".flac"});
+            }
+        }
+    }
+    return files;
+}
+
 inline std::string regressionsDir() { return std::string(ME_TEST_MEDIA_DIR) + "/../fuzz-regressions"; }
 
 }  // namespace reliability

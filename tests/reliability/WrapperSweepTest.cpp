@@ -33,28 +33,6 @@ constexpr int kMaxSamples = 3000;
 constexpr size_t kMaxHeapGrowth = size_t(256) << 20;
 constexpr size_t kMaxAllocation = size_t(64) << 20;
 
-struct SampleFile {
-    std::string name;
-    Bytes bytes;
-    bool flac;
-};
-
-std::vector<SampleFile> sampleFiles() {
-    std::vector<SampleFile> files;
-    for (const char* dir : {"audio", "mp4"}) {
-        const std::string path = std::string(ME_TEST_MEDIA_DIR) + "/" + dir;
-        for (const std::string& name : listDir(path)) {
-            const size_t dot = name.rfind('.');
-            const std::string ext = dot == std::string::npos ? "" : name.substr(dot);
-            if (ext == ".wav" || ext == ".flac" || ext == ".ogg" || ext == ".amr" || ext == ".awb" || ext == ".mp4" ||
-                ext == ".mov" || ext == ".m4a" || ext == ".3gp") {
-                files.push_back({name, readFile(path + "/" + name), ext == ".flac"});
-            }
-        }
-    }
-    return files;
-}
-
 // The offsets a file is cut or damaged at: every one of a small file; else
 // every header byte, then evenly spread over the rest.
 std::vector<size_t> offsetsOf(size_t size) {

@@ -407,7 +407,8 @@ bool QNMediaExtractorWrapper::isConvertTrack(const TrackInfo& info) const {
 size_t QNMediaExtractorWrapper::copySample(const TrackInfo& info, uint8_t* dst) const {
     MediaBufferBase* sample = info.mSample;
     const size_t length = sample->range_length();
-    memcpy(dst, static_cast<const uint8_t*>(sample->data()) + sample->range_offset(), length);
+    // An empty sample (a stored size of 0) may come without any data at all.
+    if (length > 0) memcpy(dst, static_cast<const uint8_t*>(sample->data()) + sample->range_offset(), length);
     if (info.mTrackFlags & kIsVorbis) {
         // The decoder needs the page's valid-sample count; -1 when untrimmed.
         int32_t validSamples;

@@ -35,16 +35,20 @@ def find_box(data, kind):
     return data[at + 4:at - 4 + size]
 
 
+def take_units(record, pos, count, units):
+    """Appends count units behind 16-bit lengths from pos; the position after them."""
+    for _ in range(count):
+        n = struct.unpack(">H", record[pos:pos + 2])[0]
+        units.append(record[pos + 2:pos + 2 + n])
+        pos += 2 + n
+    return pos
+
+
 def avcc_units(record):
     """SPS and PPS of an avcC (ISO/IEC 14496-15, 5.3.3.1)."""
-    units, pos = [], 5
-    for mask in (0x1F, 0xFF):
-        count = record[pos] & mask
-        pos += 1
-        for _ in range(count):
-            n = struct.unpack(">H", record[pos:pos + 2])[0]
-            units.append(record[pos + 2:pos + 2 + n])
-            pos += 2 + n
+    units = []
+    pos = take_units(record, 6, record[5] & 0x1F, units)
+    take_units(record, pos + 1, record[pos], units)
     return units
 
 
@@ -52,12 +56,7 @@ def hvcc_units(record):
     """Parameter-set units of an hvcC (ISO/IEC 14496-15, 8.3.3.1)."""
     units, pos = [], 23
     for _ in range(record[22]):
-        count = struct.unpack(">H", record[pos + 1:pos + 3])[0]
-        pos += 3
-        for _ in range(count):
-            n = struct.unpack(">H", record[pos:pos + 2])[0]
-            units.append(record[pos + 2:pos + 2 + n])
-            pos += 2 + n
+        pos = take_units(record, pos + 3, struct.unpack(">H", record[pos + 1:pos + 3])[0], units)
     return units
 
 

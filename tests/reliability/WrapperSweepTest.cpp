@@ -72,7 +72,7 @@ public:
     fuzztargets::WrapperRun run(const SampleFile& f, const MemFile& file, size_t length, const std::string& what) {
         mWatchdog.arm(f.name + " " + what);
         fuzztargets::WrapperRun r = fuzztargets::exerciseWrapper(file.fd(), int64_t(length), false, kMaxSamples);
-        if (f.flac) fuzztargets::exerciseWrapper(file.fd(), int64_t(length), true, kMaxSamples);
+        if (r.flac) fuzztargets::exerciseWrapper(file.fd(), int64_t(length), true, kMaxSamples);
         mWatchdog.disarm();
         return r;
     }
@@ -99,6 +99,7 @@ TEST(WrapperSweepTest, EveryFileOpensWhole) {
         const fuzztargets::WrapperRun r = sweep.run(f, file, f.bytes.size(), "whole");
         EXPECT_EQ(OK, r.open) << f.name;
         EXPECT_GT(r.samples, 0u) << f.name;
+        EXPECT_EQ(f.flac, r.flac) << f.name << ": the raw-frame pass depends on it";
     }
 }
 

@@ -42,16 +42,7 @@ ff -i "$tmp/plain.mp4" -map 0 -c copy -metadata:s:v:0 rotate=270 "$dir/avc_rotat
 sox -R -D -n -r 8000 -c 1 -t amr-nb "$tmp/tone.amr" synth 1 sine 440
 ff -i "$tmp/tone.amr" -c copy "$dir/amr_nb.3gp"
 
-facts() {
-  ffprobe -v error -show_streams -show_packets -show_format -of json "$1" | jq -r '
-    def us(t; tb): (t * 1000000 * (tb | split("/") | (.[0] | tonumber) / (.[1] | tonumber))) | round;
-    .streams as $s |
-    def secs(t): ((t // "0") | tonumber * 1000000) | round;
-    "format \(secs(.format.duration)) \(.format.tags.location // "-")",
-    ($s[] | "stream \(.index) \(.codec_name) \(.codec_tag_string) \(secs(.duration)) \(.width // 0) \(.height // 0) \(.sample_rate // 0) \(.channels // 0) \([.side_data_list[]? | .rotation // empty][0] // 0)"),
-    (.packets[] | . as $p | $s[$p.stream_index].time_base as $tb |
-      "packet \($p.stream_index) \(us($p.pts; $tb)) \(us($p.dts; $tb)) \($p.size) \(if ($p.flags | startswith("K")) then 1 else 0 end)")'
-}
+. "$(dirname "$0")/mp4_facts.sh"
 for f in "$dir"/*.mp4 "$dir"/*.mov "$dir"/*.m4a "$dir"/*.3gp; do
   facts "$f" > "$f.facts"
 done

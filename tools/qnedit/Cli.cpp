@@ -17,6 +17,7 @@ Args::Args(const std::vector<std::string>& words, const std::vector<std::string>
     for (size_t i = 0; i < words.size(); ++i) {
         const std::string& w = words[i];
         if (w.size() < 2 || w[0] != '-' || (w[1] != '-' && w != "-o")) {
+            if (w.empty()) usageError("an empty argument is not a file name");
             mPositional.push_back(w);
             continue;
         }
@@ -37,6 +38,7 @@ Args::Args(const std::vector<std::string>& words, const std::vector<std::string>
                 if (i + 1 >= words.size()) usageError("option " + name + " needs a value");
                 value = words[++i];
             }
+            if (value.empty()) usageError("option " + name + " needs a value");
             mValues[name] = value;
         } else {
             usageError("unknown option " + name);
@@ -59,6 +61,11 @@ long Args::getInt(const std::string& name, long fallback) const {
     return it == mValues.end() ? fallback : parseInt(it->second, name);
 }
 
+long Args::getIntIn(const std::string& name, long fallback, long lo, long hi) const {
+    auto it = mValues.find(name);
+    return it == mValues.end() ? fallback : parseIntIn(it->second, name, lo, hi);
+}
+
 void Args::expectPositional(size_t n, const char* usage) const {
     if (mPositional.size() != n) usageError(std::string("usage: ") + usage);
 }
@@ -77,6 +84,21 @@ long parseInt(const std::string& text, const std::string& what) {
     const long v = strtol(text.c_str(), &end, 10);
     if (text.empty() || *end != '\0' || errno != 0) usageError(what + ": not a whole number: " + text);
     return v;
+}
+
+long parseIntIn(const std::string& text, const std::string& what, long lo, long hi) {
+    const long v = parseInt(text, what);
+    if (v < lo || v > hi) usageError(what + " takes " + std::to_string(lo) + " to " + std::to_string(hi) + ", not " + text);
+    return v;
+}
+
+int64_t parseSeconds(const std::string& text, const std::string& what) {
+    // About 31 years: longer than any recording, far from int64 overflow in microseconds.
+    constexpr double kMaxSeconds = 1e9;
+    const double v = parseDouble(text, what);
+    if (v < 0) usageError(what + " must not be negative");
+    if (v > kMaxSeconds) usageError(what + " is out of range: " + text);
+    return static_cast<int64_t>(std::llround(v * 1e6));
 }
 
 std::vector<std::string> splitList(const std::string& text, char sep) {

@@ -1,6 +1,7 @@
 #ifndef QNEDIT_CLI_H
 #define QNEDIT_CLI_H
 
+#include <cstdint>
 #include <map>
 #include <stdexcept>
 #include <string>
@@ -33,6 +34,7 @@ public:
     std::string get(const std::string& name, const std::string& fallback = "") const;
     double getDouble(const std::string& name, double fallback) const;
     long getInt(const std::string& name, long fallback) const;
+    long getIntIn(const std::string& name, long fallback, long lo, long hi) const;
     // Exactly `n` positional arguments, else a usage error naming `usage`.
     void expectPositional(size_t n, const char* usage) const;
 
@@ -44,6 +46,11 @@ private:
 
 double parseDouble(const std::string& text, const std::string& what);
 long parseInt(const std::string& text, const std::string& what);
+// A whole number within [lo, hi], else a usage error naming `what`.
+long parseIntIn(const std::string& text, const std::string& what, long lo, long hi);
+// A non-negative time in seconds as microseconds; values too large for any
+// recording are refused rather than overflowing.
+int64_t parseSeconds(const std::string& text, const std::string& what);
 // "a,b,c" -> {"a","b","c"}
 std::vector<std::string> splitList(const std::string& text, char sep = ',');
 std::string lowerExtension(const std::string& path);

@@ -49,16 +49,14 @@ int32_t colorFormatOf(const std::string& name) {
 void parseSize(const std::string& text, int* w, int* h) {
     const size_t x = text.find('x');
     if (x == std::string::npos) usageError("--size takes WxH, e.g. 1280x720");
-    *w = static_cast<int>(parseInt(text.substr(0, x), "--size"));
-    *h = static_cast<int>(parseInt(text.substr(x + 1), "--size"));
-    if (*w <= 0 || *h <= 0 || *w > 16384 || *h > 16384) usageError("--size out of range: " + text);
+    *w = static_cast<int>(parseIntIn(text.substr(0, x), "--size", 1, 16384));
+    *h = static_cast<int>(parseIntIn(text.substr(x + 1), "--size", 1, 16384));
 }
 
 std::vector<uint8_t> readWhole(const std::string& path) {
-    const int fd = open(path.c_str(), O_RDONLY | O_CLOEXEC);
-    if (fd < 0) inputError(path + ": cannot open (" + strerror(errno) + ")");
+    const int fd = openRegularFile(path);
     struct stat st;
-    if (fstat(fd, &st) != 0 || !S_ISREG(st.st_mode) || st.st_size > (int64_t(1) << 30)) {
+    if (fstat(fd, &st) != 0 || st.st_size > (int64_t(1) << 30)) {
         close(fd);
         inputError(path + ": not a frame file");
     }
@@ -86,17 +84,18 @@ int runFrame(const std::vector<std::string>& words) {
     int width, height;
     parseSize(args.get("--size"), &width, &height);
     const int32_t colorFormat = colorFormatOf(args.get("--format"));
-    const int stride = static_cast<int>(args.getInt("--stride", width));
-    const int sliceHeight = static_cast<int>(args.getInt("--slice-height", height));
-    if (stride < width || sliceHeight < height) usageError("--stride and --slice-height must cover the picture");
+    // Bounded so that every plane size below fits comfortably in 64 bits and the
+    // converter's int arithmetic.
+    const int stride = static_cast<int>(args.getIntIn("--stride", width, width, 4 * 16384));
+    const int sliceHeight = static_cast<int>(args.getIntIn("--slice-height", height, height, 4 * 16384));
     int left = 0, top = 0, right = width - 1, bottom = height - 1;
     if (args.has("--crop")) {
         const std::vector<std::string> parts = splitList(args.get("--crop"));
         if (parts.size() != 4) usageError("--crop takes L,T,R,B");
-        left = static_cast<int>(parseInt(parts[0], "--crop"));
-        top = static_cast<int>(parseInt(parts[1], "--crop"));
-        right = static_cast<int>(parseInt(parts[2], "--crop"));
-        bottom = static_cast<int>(parseInt(parts[3], "--crop"));
+        left = static_cast<int>(parseIntIn(parts[0], "--crop", 0, width - 1));
+        top = static_cast<int>(parseIntIn(parts[1], "--crop", 0, height - 1));
+        right = static_cast<int>(parseIntIn(parts[2], "--crop", 0, width - 1));
+        bottom = static_cast<int>(parseIntIn(parts[3], "--crop", 0, height - 1));
         if (left < 0 || top < 0 || right < left || bottom < top || right >= width || bottom >= height) {
             usageError("--crop must lie inside the picture");
         }
@@ -113,7 +112,8 @@ int runFrame(const std::vector<std::string>& words) {
     const std::string inPath = args.positional()[0];
     const std::vector<uint8_t> frame = readWhole(inPath);
     // A 4:2:0 frame: the luma plane and two quarter-size chroma planes.
-    const size_t need = size_t(stride) * sliceHeight + 2 * (size_t((stride + 1) / 2) * ((sliceHeight + 1) / 2));
+    const uint64_t need = uint64_t(stride) * uint64_t(sliceHeight) +
+                          2 * ((uint64_t(stride) + 1) / 2) * ((uint64_t(sliceHeight) + 1) / 2);
     if (frame.size() < need) {
         inputError(inPath + ": " + std::to_string(frame.size()) + " bytes, a " + std::to_string(stride) + "x" +
                    std::to_string(sliceHeight) + " 4:2:0 frame needs " + std::to_string(need));
@@ -137,7 +137,7 @@ int runFrame(const std::vector<std::string>& words) {
     const status_t err = colors->convert(frame.data(), rgb.data());
     if (err != OK) inputError(inPath + ": the colour converter refused the frame (" + describeStatus(err) + ")");
 
-    OutputFile out(outPath);
+    OutputFile out(outPath, {inPath});
     std::string error;
     if (!writePng(out.fd(), rgb565ToImage(rgb.data(), outW, outH), &error)) inputError(outPath + ": " + error);
     out.commit();

@@ -6,11 +6,13 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <media/stagefright/ExtractorRefusal.h>
 #include <media/stagefright/FileSource.h>
 #include <media/stagefright/MediaErrors.h>
 #include <media/stagefright/MediaExtractorFactory.h>
 
 #include "Cli.h"
+#include "OutputFile.h"
 #include "QNMediaEditorDefs.h"
 
 using namespace android;
@@ -28,19 +30,42 @@ std::string describeStatus(int status) {
         case NO_INIT: return "cannot be read";
         case BAD_VALUE: return "bad value";
         case INVALID_OPERATION: return "invalid operation";
-        default: return "error " + std::to_string(status);
+        default:
+            // The writers report a failed system call as its negated errno.
+            if (status < 0 && status > -4096) return systemCause(-status);
+            return "error " + std::to_string(status);
     }
 }
 
-Input::Input(const std::string& path, bool flacRaw) : mPath(path) {
-    mFd = open(path.c_str(), O_RDONLY | O_CLOEXEC);
-    if (mFd < 0) inputError(path + ": cannot open (" + strerror(errno) + ")");
+std::string describeWriteStatus(int status) {
+    return status == ERROR_IO ? "input/output error" : describeStatus(status);
+}
+
+int openRegularFile(const std::string& path) {
+    // Non-blocking, so that a FIFO without a writer is refused instead of
+    // waiting forever; regular files ignore the flag.
+    const int fd = open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK);
+    if (fd < 0) inputError(path + ": cannot open (" + systemCause(errno) + ")");
     struct stat st;
-    if (fstat(mFd, &st) != 0 || !S_ISREG(st.st_mode)) inputError(path + ": not a regular file");
+    if (fstat(fd, &st) != 0 || !S_ISREG(st.st_mode)) {
+        close(fd);
+        inputError(path + ": not a regular file");
+    }
+    fcntl(fd, F_SETFL, fcntl(fd, F_GETFL) & ~O_NONBLOCK);
+    return fd;
+}
+
+Input::Input(const std::string& path, bool flacRaw) : mPath(path) {
+    mFd = openRegularFile(path);
+    struct stat st;
+    if (fstat(mFd, &st) != 0) inputError(path + ": cannot open (" + systemCause(errno) + ")");
     mFileSize = st.st_size;
     mWrapper = new QNMediaExtractorWrapper();
     const status_t err = mWrapper->setDataSource(mFd, 0, mFileSize);
-    if (err != OK) inputError(path + ": " + describeStatus(err));
+    if (err != OK) {
+        const std::string why = takeRefusalReason();
+        inputError(path + ": " + describeStatus(err) + (why.empty() ? "" : " (" + why + ")"));
+    }
     if (flacRaw) {
         mWrapper->setFlacRaw(true);
         mWrapper->setOutputFormatFlag(kEditorExtractorOutputFormat_FlacRaw);

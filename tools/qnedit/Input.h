@@ -47,6 +47,11 @@ private:
 
 // A status as a short cause for an error line.
 std::string describeStatus(int status);
+// The same for a writer's status, where a plain I/O error is not a read error.
+std::string describeWriteStatus(int status);
+// Opens a regular file for reading; anything else (FIFO, device, directory)
+// is refused without blocking.
+int openRegularFile(const std::string& path);
 
 }  // namespace qnedit
 

@@ -1,10 +1,12 @@
 #include <algorithm>
 #include <cmath>
+#include <cstdint>
 #include <cstdlib>
 #include <deque>
 #include <vector>
 
 #include <media/stagefright/MediaDefs.h>
+#include <media/stagefright/MediaErrors.h>
 #include <media/stagefright/foundation/ABuffer.h>
 
 #include "Cli.h"
@@ -13,6 +15,8 @@
 #include "MuxerOutput.h"
 #include "OutputFile.h"
 #include "Progress.h"
+#include "Interrupt.h"
+#include "ReadCoverage.h"
 #include "QNMediaAudioConverter.h"
 #include "QNMediaAudioEffect.h"
 #include "QNMediaEditorAdapter.h"
@@ -34,7 +38,9 @@ const char* const kMixHelp =
     "  --mixer TYPE    0 main only, 1 background only, 2 average, 3 background\n"
     "                  over main, 4 sum (default), 5 main ducked under background\n"
     "  --offset MS     when the background starts, relative to the main audio;\n"
-    "                  negative skips its beginning (default: the device setting)\n";
+    "                  negative skips its beginning (default: the device setting)\n"
+    "  --salvage       mix what can be read of a damaged input (with a warning)\n"
+    "                  instead of failing\n";
 
 namespace {
 
@@ -74,7 +80,7 @@ public:
         }
         in.wrapper().selectTrack(bgm.index);
         if (offsetMs > 0) {
-            mPending.assign(static_cast<size_t>(offsetMs * main.sampleRate / 1000) * mFrameBytes, 0);
+            mSilenceBytes = static_cast<int64_t>(offsetMs) * main.sampleRate / 1000 * static_cast<int64_t>(mFrameBytes);
         } else if (offsetMs < 0) {
             mSkipBytes = static_cast<int64_t>(-offsetMs * main.sampleRate / 1000) * mFrameBytes;
         }
@@ -85,6 +91,12 @@ public:
 
     // Up to `bytes` bytes of converted background; fewer at its end.
     std::vector<uint8_t> take(size_t bytes) {
+        // The silence before a late start is made as it is needed, not held.
+        if (mSilenceBytes > 0) {
+            const size_t n = static_cast<size_t>(std::min<int64_t>(mSilenceBytes, static_cast<int64_t>(bytes)));
+            mSilenceBytes -= static_cast<int64_t>(n);
+            return std::vector<uint8_t>(n / mFrameBytes * mFrameBytes, 0);
+        }
         while (mPending.size() < bytes && !mDone) refill();
         const size_t n = std::min(bytes, mPending.size()) / mFrameBytes * mFrameBytes;
         std::vector<uint8_t> chunk(mPending.begin(), mPending.begin() + n);
@@ -111,7 +123,11 @@ private:
     void refill() {
         QNMediaExtractorWrapper& w = mIn.wrapper();
         sp<ABuffer> buffer;
-        if (w.readSampleData(&buffer) != OK) {
+        int64_t timeUs = 0;
+        if (w.getSampleTime(&timeUs) == OK) mCoverage.saw(0, timeUs);
+        const status_t err = w.readSampleData(&buffer);
+        if (err != OK && err != ERROR_END_OF_STREAM) mCoverage.fail(timeUs, describeStatus(err));
+        if (err != OK) {
             // End of the background: drain what the resampler holds.
             ensureOutput(65536);
             for (int guard = 0; guard < 1 << 16; ++guard) {
@@ -120,6 +136,7 @@ private:
                 append(mOut, made);
             }
             mDone = true;
+            if (mDurationUs > 0) mCoverage.expectReach(0, mDurationUs);
             return;
         }
         w.advance();
@@ -129,8 +146,16 @@ private:
         append(mOut, made);
     }
 
+public:
+    // What reading the background showed; complete once it was read to its end.
+    const ReadCoverage& coverage() const { return mCoverage; }
+
+private:
     Input& mIn;
     const size_t mFrameBytes;
+    const int64_t mDurationUs = mIn.durationUs();
+    ReadCoverage mCoverage;
+    int64_t mSilenceBytes = 0;
     sp<QNMediaAudioConverter> mConverter;
     unsigned char* mOut = nullptr;
     int mOutCapacityFor = 0;
@@ -142,20 +167,24 @@ private:
 }  // namespace
 
 int runMix(const std::vector<std::string>& words) {
-    Args args(words, {"--main-gain", "--bgm-gain", "--mixer", "--offset"}, {});
+    Args args(words, {"--main-gain", "--bgm-gain", "--mixer", "--offset"}, {"--salvage"});
     args.expectPositional(3, "qnedit mix MAIN BGM OUT [--main-gain DB] [--bgm-gain DB] [--mixer TYPE] [--offset MS]");
     const std::string outPath = args.positional()[2];
     const std::string ext = lowerExtension(outPath);
     if (ext != "wav" && ext != "flac") usageError("OUT must end in .wav or .flac");
-    const long mainGain = args.getInt("--main-gain", 0), bgmGain = args.getInt("--bgm-gain", 0);
-    const long mixer = args.getInt("--mixer", 4);
-    if (mixer < 0 || mixer > 5) usageError("--mixer takes 0 to 5");
-    int offsetMs = 0;
+    const long mainGain = args.getIntIn("--main-gain", 0, -60, 60), bgmGain = args.getIntIn("--bgm-gain", 0, -60, 60);
+    const long mixer = args.getIntIn("--mixer", 4, 0, 5);
+    const std::vector<std::string> inputs = {args.positional()[0], args.positional()[1]};
+    checkOutputPath(outPath, inputs);
+    long offset = 0;
     if (args.has("--offset")) {
-        offsetMs = static_cast<int>(args.getInt("--offset", 0));
+        offset = args.getIntIn("--offset", 0, INT32_MIN, INT32_MAX);
     } else {
-        Adapter::GetBGMSyncFromKestro(&offsetMs);
+        int fromSettings = 0;
+        Adapter::GetBGMSyncFromKestro(&fromSettings);
+        offset = fromSettings;
     }
+    const int offsetMs = static_cast<int>(offset);
     int ditherType = 0;
     const bool haveDither = Adapter::GetUseDitherTypeFromKestro(&ditherType);
 
@@ -163,6 +192,14 @@ int runMix(const std::vector<std::string>& words) {
     Input bgmIn(args.positional()[1]);
     const PcmTrack main = findPcm(mainIn);
     const PcmTrack bgm = findPcm(bgmIn);
+    // An offset outside the recordings would mix nothing: say so rather than
+    // write the main audio unchanged (or hold minutes of silence).
+    if (mainIn.durationUs() > 0 && int64_t(offsetMs) * 1000 >= mainIn.durationUs()) {
+        usageError("--offset " + std::to_string(offsetMs) + " ms lies past the end of the main recording");
+    }
+    if (bgmIn.durationUs() > 0 && -int64_t(offsetMs) * 1000 >= bgmIn.durationUs()) {
+        usageError("--offset " + std::to_string(offsetMs) + " ms skips all of the background");
+    }
 
     sp<QNMediaAudioEffect> effect = new QNMediaAudioEffect();
     effect->setParamAudioInfo(main.bits, main.sampleRate, main.channels);
@@ -170,7 +207,7 @@ int runMix(const std::vector<std::string>& words) {
     effect->setParamChainType(static_cast<int>(mainGain), static_cast<int>(bgmGain), 0, static_cast<int>(mixer));
     Background background(bgmIn, bgm, main, offsetMs);
 
-    OutputFile out(outPath);
+    OutputFile out(outPath, inputs);
     sp<QNMediaMuxer> muxer = new QNMediaMuxer(out.fd(), ext == "wav" ? OUTPUT_FILE_FORMAT_WAVE : OUTPUT_FILE_FORMAT_FLAC);
     const ssize_t track = muxer->addTrack(main.format->dup());
     if (track < 0) inputError(outPath + ": the writer refused the audio format");
@@ -180,10 +217,16 @@ int runMix(const std::vector<std::string>& words) {
     w.selectTrack(main.index);
     Progress progress("mix", mainIn.durationUs());
     int64_t time = 0;
+    ReadCoverage coverage;
     while (w.getSampleTime(&time) == OK) {
+        checkInterrupted();
+        coverage.saw(main.index, time);
         sp<ABuffer> buffer;
         const status_t err = w.readSampleData(&buffer);
-        if (err != OK) inputError(mainIn.path() + ": " + describeStatus(err));
+        if (err != OK) {
+            coverage.fail(time, describeStatus(err));
+            break;
+        }
         std::vector<uint8_t> aux = background.take(buffer->size());
         if (!aux.empty() && effect->writeAux(aux.data(), static_cast<int>(aux.size())) < 0) {
             inputError("the mixer could not take the background audio");
@@ -191,11 +234,16 @@ int runMix(const std::vector<std::string>& words) {
         const int mixed = effect->processEffectChain(buffer->data(), buffer->data(), static_cast<int>(buffer->size()));
         if (mixed < 0) inputError("the mixer failed");
         buffer->setRange(buffer->offset(), std::min<size_t>(buffer->size(), static_cast<size_t>(mixed)));
-        if (muxer->writeSampleData(0, buffer, static_cast<size_t>(track), time, 1) != OK) inputError(outPath + ": write failed");
+        const status_t werr = muxer->writeSampleData(0, buffer, static_cast<size_t>(track), time, 1);
+        if (werr != OK) inputError(outPath + ": write failed (" + describeWriteStatus(werr) + ")");
         progress.update(time);
         if (w.advance() != OK) break;
     }
     progress.finish();
+    if (mainIn.durationUs() > 0) coverage.expectReach(main.index, mainIn.durationUs());
+    const bool salvage = args.has("--salvage");
+    coverage.report(mainIn.path(), salvage);
+    background.coverage().report(bgmIn.path(), salvage);
     finishOutput(muxer, out);
     fprintf(stderr, "mixed with offset %d ms, mixer %ld%s -> %s\n", offsetMs, mixer,
             haveDither ? (", dither type " + std::to_string(ditherType)).c_str() : "", outPath.c_str());

@@ -1,4 +1,5 @@
 #include <algorithm>
+#include <cerrno>
 #include <cstdio>
 #include <cstring>
 #include <unistd.h>
@@ -115,7 +116,8 @@ void writeAll(OutputFile& out, const void* data, size_t size) {
     const uint8_t* p = static_cast<const uint8_t*>(data);
     while (size > 0) {
         const ssize_t n = write(out.fd(), p, size);
-        if (n <= 0) inputError(out.path() + ": write failed");
+        if (n < 0 && errno == EINTR) continue;
+        if (n <= 0) inputError(out.path() + ": write failed (" + systemCause(n < 0 ? errno : EIO) + ")");
         p += n;
         size -= static_cast<size_t>(n);
     }
@@ -129,6 +131,7 @@ int runWaveform(const std::vector<std::string>& words) {
     const std::string outPath = args.get("-o", args.get("--output"));
     const std::string ext = lowerExtension(outPath);
     if (!outPath.empty() && ext != "json" && ext != "png" && ext != "bin") usageError("-o must end in .json, .png or .bin");
+    if (!outPath.empty()) checkOutputPath(outPath, {args.positional()[0]});
     Input in(args.positional()[0]);
     bool stored = false;
     const std::vector<uint16_t> values = buildFromPcm(in, &stored);
@@ -136,7 +139,7 @@ int runWaveform(const std::vector<std::string>& words) {
         fputs(toJson(values, stored).c_str(), stdout);
         return kExitOk;
     }
-    OutputFile out(outPath);
+    OutputFile out(outPath, {args.positional()[0]});
     if (ext == "json") {
         const std::string text = toJson(values, stored);
         writeAll(out, text.data(), text.size());

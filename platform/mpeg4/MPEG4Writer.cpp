@@ -79,6 +79,9 @@ status_t MPEG4Writer::Impl::start(MetaData* params) {
         if (params->findInt32(kKeyRealTimeRecording, &v)) realTime = v != 0;
     }
     auto fail = [this](status_t err) {
+        // No reader will run: end every source so that a producer pushing
+        // into one is refused instead of waiting on a full queue.
+        for (auto& slot : slots) slot->source->stop();
         state = State::kFailed;
         sharedItems.close();
         result = err;
@@ -94,15 +97,14 @@ status_t MPEG4Writer::Impl::start(MetaData* params) {
     mdatStart = static_cast<int64_t>(header.size());
     const std::string placeholder = Mp4MdatPlaceholder();
     header.bytes(placeholder.data(), placeholder.size());
-    if (header.writeTo(sink.get()) != OK) {
+    if (const status_t err = header.writeTo(sink.get())) {
         ALOGE("cannot write the file header");
-        return fail(ERROR_IO);
+        return fail(err);
     }
     for (size_t i = 0; i < slots.size(); ++i) {
         const status_t err = slots[i]->source->start(nullptr);
         if (err != OK) {
             ALOGE("source of track %zu failed to start: %d", i, err);
-            for (size_t k = 0; k < i; ++k) slots[k]->source->stop();
             return fail(err);
         }
     }
@@ -184,7 +186,7 @@ status_t MPEG4Writer::Impl::finishFile() {
     if (ioError != OK) return ioError;
     const uint64_t payload = static_cast<uint64_t>(sink->position() - mdatStart) - kMdatReserve;
     const std::string mdatHeader = Mp4MdatHeader(payload);
-    if (sink->writeAt(mdatStart, mdatHeader.data(), mdatHeader.size()) != OK) return ERROR_IO;
+    if (const status_t err = sink->writeAt(mdatStart, mdatHeader.data(), mdatHeader.size())) return err;
 
     status_t trackError = OK;
     std::vector<const Mp4TrackWriter*> finished;
@@ -202,11 +204,13 @@ status_t MPEG4Writer::Impl::finishFile() {
     Mp4BoxWriter tail;
     Mp4WriteMovie(tail, finished, items, sharedItems.snapshot(), rotation);
     items.writeUuidBox(tail);
-    if (tail.writeTo(sink.get()) != OK) {
+    if (const status_t err = tail.writeTo(sink.get())) {
         ALOGE("cannot write the movie box");
-        return ERROR_IO;
+        return err;
     }
-    return trackError;
+    if (trackError != OK) return trackError;
+    // The file is complete only once it is on the device, as for the other writers.
+    return sink->sync();
 }
 
 MPEG4Writer::MPEG4Writer(int fd) : MPEG4Writer(fd, FileBrand::kMp4) {}

@@ -43,11 +43,14 @@ status_t FdSink::pwriteAll(int64_t fileOffset, const void* data, size_t size) {
     while (size > 0) {
         const ssize_t n = pwrite(mFd, p, size, fileOffset);
         if (n < 0) {
-            if (errno == EINTR) continue;
-            ALOGE("write failed: %s", strerror(errno));
-            return ERROR_IO;
+            const int cause = errno;
+            if (cause == EINTR) continue;
+            ALOGE("write failed: %s", strerror(cause));
+            // The cause itself (ENOSPC, EDQUOT, EIO...) is what the caller
+            // must be able to tell the user.
+            return -cause;
         }
-        if (n == 0) return ERROR_IO;
+        if (n == 0) return -EIO;
         p += n;
         size -= static_cast<size_t>(n);
         fileOffset += n;
@@ -84,8 +87,13 @@ status_t FdSink::readAt(int64_t offset, void* data, size_t size) {
 status_t FdSink::sync() {
     if (mFd < 0) return NO_INIT;
     // Pipes and character devices cannot be synced; that is not a failure.
-    if (fsync(mFd) != 0 && errno != EINVAL && errno != EROFS) return ERROR_IO;
-    return OK;
+    // Anything else (EIO, ENOSPC, EDQUOT on file systems that allocate late)
+    // means the data may not be on the device.
+    if (fsync(mFd) == 0) return OK;
+    const int cause = errno;
+    if (cause == EINVAL || cause == EROFS) return OK;
+    ALOGE("fsync failed: %s", strerror(cause));
+    return -cause;
 }
 
 status_t MemorySink::write(const void* data, size_t size) {

@@ -1,6 +1,8 @@
 #define LOG_TAG "SingleSourceWriter"
 #include "writer/SingleSourceWriter.h"
 
+#include <cerrno>
+
 #include <fcntl.h>
 
 #include <log/log.h>
@@ -75,7 +77,7 @@ status_t SingleSourceWriter::start() {
         err = BAD_VALUE;
     } else if ((flags & O_ACCMODE) == O_RDONLY) {
         ALOGE("%s: file descriptor %d is not writable", mName, mFd);
-        err = ERROR_IO;
+        err = -EBADF;  // what the first write would have met
     }
     if (err == OK) {
         err = mSource->start();
@@ -84,12 +86,12 @@ status_t SingleSourceWriter::start() {
     if (err == OK) {
         mSink = new FdSink(mFd);
         err = mFormat->writeHeader(*mSink, mSource->getFormat());
-        if (err != OK) {
-            ALOGE("%s: writing the header failed (%d)", mName, err);
-            mSource->stop();
-        }
+        if (err != OK) ALOGE("%s: writing the header failed (%d)", mName, err);
     }
     if (err != OK) {
+        // No reader will run: end the source so that a producer pushing into
+        // it is refused instead of waiting forever on a full queue.
+        mSource->stop();
         recordError(err);
         mReachedEOS = true;
         return err;

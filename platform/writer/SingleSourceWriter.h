@@ -20,7 +20,9 @@ namespace android {
 // Memory does not grow with the stream: one buffer is held at a time.
 // After a write error the thread keeps taking buffers (and drops them) until
 // the end of the stream, so that a producer blocked on a full queue is never
-// left waiting; stop() then answers the first error.
+// left waiting; stop() then answers the first error. A failed start() ends
+// the source for the same reason. Failed system calls are reported as their
+// negated errno (-ENOSPC...), and a stop() that succeeds has synced the file.
 class SingleSourceWriter {
 public:
     class Format {

@@ -1,5 +1,7 @@
 #include <gtest/gtest.h>
 
+#include <cerrno>
+
 #include <media/stagefright/FLACWriter.h>
 #include <media/stagefright/FileSource.h>
 #include <media/stagefright/MediaDefs.h>
@@ -347,8 +349,8 @@ TEST(FLACWriterTest, HeaderlessFramesEmptyStreamsAndRefusals) {
         const int readOnly = open(file.path().c_str(), O_RDONLY);
         sp<FLACWriter> writer = new FLACWriter(readOnly);
         ASSERT_EQ(OK, writer->addSource(makeSource(pcmFormat(2, 44100, kAudioEncodingPcm16bit))));
-        EXPECT_EQ(ERROR_IO, writer->start());
-        EXPECT_EQ(ERROR_IO, writer->stop());
+        EXPECT_EQ(-EBADF, writer->start());
+        EXPECT_EQ(-EBADF, writer->stop());
         close(readOnly);
 
         writer = new FLACWriter(file.fd);

@@ -5,6 +5,7 @@
 #include <unistd.h>
 
 #include <atomic>
+#include <cerrno>
 #include <future>
 
 #include <gtest/gtest.h>
@@ -124,8 +125,8 @@ TEST_F(MPEG4WriterLifecycle, DescriptorsThatCannotBeWritten) {
         const int readOnly = open(mPath.c_str(), O_RDONLY);
         sp<MPEG4Writer> w = new MPEG4Writer(readOnly);
         EXPECT_EQ(OK, w->addSource(new MediaAdapter(format(MEDIA_MIMETYPE_AUDIO_AMR_NB))));
-        EXPECT_EQ(ERROR_IO, w->start());
-        EXPECT_EQ(ERROR_IO, w->stop());
+        EXPECT_EQ(-EBADF, w->start());
+        EXPECT_EQ(-EBADF, w->stop());
         close(readOnly);
     }
     {
@@ -142,7 +143,7 @@ TEST_F(MPEG4WriterLifecycle, DescriptorsThatCannotBeWritten) {
         const WriteResult r =
             writeThroughAdapters(w, {format(MEDIA_MIMETYPE_AUDIO_AMR_NB)}, samples, nullptr, [fd] { close(fd); });
         EXPECT_EQ(OK, r.start);
-        EXPECT_EQ(ERROR_IO, r.stop);
+        EXPECT_EQ(-EBADF, r.stop);
     }
 }
 

@@ -1,5 +1,6 @@
 #include <gtest/gtest.h>
 
+#include <cerrno>
 #include <csignal>
 #include <cmath>
 #include <sys/resource.h>
@@ -312,7 +313,7 @@ TEST(WAVEWriterTest, AWriteFailureMidStreamIsReportedAndNeverBlocksTheProducer) 
 
     setrlimit(RLIMIT_FSIZE, &saved);
     signal(SIGXFSZ, previous);
-    EXPECT_EQ(ERROR_IO, err);
+    EXPECT_EQ(-EFBIG, err);
     EXPECT_TRUE(logs.containsAt(ANDROID_LOG_ERROR, "dropping the rest"));
     // The header describes the samples that were written in full (a
     // partly written one may follow them).

@@ -15,7 +15,7 @@ namespace android {
 // bytes in place (sizes fixed up when a file is finished).
 class ByteSink : public RefBase {
 public:
-    // Appends; OK or an error status (ERROR_IO).
+    // Appends; OK or an error status (a negated errno for a failed write).
     virtual status_t write(const void* data, size_t size) = 0;
     // Overwrites bytes that were already written.
     virtual status_t writeAt(int64_t offset, const void* data, size_t size) = 0;
@@ -48,7 +48,8 @@ public:
     int64_t position() const override { return mPosition; }
     // Needs a descriptor opened for reading too.
     status_t readAt(int64_t offset, void* data, size_t size) override;
-    // Pushes what was written to the device.
+    // Pushes what was written to the device; a negated errno when that
+    // fails (descriptors that cannot be synced, like pipes, answer OK).
     status_t sync();
 
 private:

@@ -1,12 +1,15 @@
 #include <gtest/gtest.h>
 
 #include <cstring>
+#include <set>
 
 #include <media/stagefright/MediaDefs.h>
 
 #include "extractor/DeviceKeys.h"
 #include "extractor/Sniffers.h"
+#include "LogCapture.h"
 #include "extractors/AudioMediaFacts.h"
+#include "wrapper/WrapperMedia.h"
 
 using namespace android;
 using namespace audiotest;
@@ -14,7 +17,8 @@ using namespace audiotest;
 namespace {
 
 typedef MediaTrack::ReadOptions O;
-const char* const kFlacFiles[] = {"b4096.flac", "b1152.flac", "s24.flac", "items.flac"};
+// vbs.flac has variable block sizes (sync code 0xFFF9, coded sample numbers).
+const char* const kFlacFiles[] = {"b4096.flac", "b1152.flac", "s24.flac", "items.flac", "vbs.flac"};
 
 sp<IMediaExtractor> Open(const std::string& file, uint32_t flag = 0) {
     sp<IMediaExtractor> extractor = CreateFLACExtractor(OpenMedia(file));
@@ -178,6 +182,60 @@ TEST(FLACExtractorTest, SeeksInBothOutputForms) {
         ASSERT_LE((sample + 1) * 2, static_cast<int64_t>(pcm.size()));
         EXPECT_TRUE(std::equal(s[0].bytes.begin(), s[0].bytes.end(), pcm.begin() + sample * 2)) << t;
     }
+}
+
+TEST(FLACExtractorTest, VariableBlockSizesSeekBySampleNumber) {
+    const std::vector<Packet> packets = Packets("vbs.flac");
+    const std::vector<Sample> frames = ReadTrack(Open("vbs.flac", 5));
+    ASSERT_EQ(frames.size(), packets.size());
+    std::set<int64_t> sizes;
+    for (size_t i = 0; i < frames.size(); ++i) {
+        ASSERT_GE(frames[i].bytes.size(), 2u);
+        EXPECT_EQ(0xF9, frames[i].bytes[1]) << i;
+        sizes.insert(packets[i].duration);
+    }
+    EXPECT_GE(sizes.size(), 10u);  // the file really mixes block sizes
+
+    // Seeking to the middle of each frame: the raw form lands on that frame,
+    // the PCM form on the very sample, with the bytes of a full decode.
+    const std::vector<uint8_t> pcm = Concat(ReadTrack(Open("vbs.flac")));
+    const size_t frameBytes = 4;
+    for (size_t i = 0; i < packets.size(); ++i) {
+        const int64_t t = (packets[i].pts + packets[i].duration / 2) * 1000000 / 44100;
+        O options;
+        options.setSeekTo(t, O::SEEK_PREVIOUS_SYNC);
+        const std::vector<Sample> raw = ReadTrack(Open("vbs.flac", 5), nullptr, &options, 1);
+        ASSERT_EQ(raw.size(), 1u) << i;
+        EXPECT_EQ(raw[0].bytes, frames[i].bytes) << i;
+        EXPECT_EQ(raw[0].timeUs, frames[i].timeUs) << i;
+
+        const std::vector<Sample> decoded = ReadTrack(Open("vbs.flac"), nullptr, &options, 1);
+        ASSERT_EQ(decoded.size(), 1u) << i;
+        const int64_t sample = t * 44100 / 1000000;
+        EXPECT_EQ(decoded[0].timeUs, sample * 1000000 / 44100) << i;
+        ASSERT_LE(sample * frameBytes + decoded[0].bytes.size(), pcm.size()) << i;
+        EXPECT_TRUE(std::equal(decoded[0].bytes.begin(), decoded[0].bytes.end(), pcm.begin() + sample * frameBytes)) << i;
+    }
+}
+
+TEST(FLACExtractorTest, VariableBlockSizesAreNotOfferedForLosslessTrim) {
+    // Renumbering frames needs one block size; these frames are still read.
+    LogCapture log;
+    sp<wrappertest::QNMediaExtractorWrapper> wrapper = wrappertest::OpenWrapper(MediaPath("vbs.flac"));
+    ASSERT_NE(wrapper, nullptr);
+    ASSERT_EQ(OK, wrapper->setOutputFormatFlag(5));
+    ASSERT_EQ(OK, wrapper->setFlacRaw(true));
+    sp<AMessage> format;
+    ASSERT_EQ(OK, wrapper->getTrackFormat(0, &format));
+    int32_t trim = 0;
+    EXPECT_FALSE(format->findInt32("editor-flactrim", &trim));
+    EXPECT_TRUE(log.contains("not support flac raw format"));
+
+    ASSERT_EQ(OK, wrapper->selectTrack(0));
+    const std::vector<wrappertest::Delivered> frames = wrappertest::ReadAll(wrapper);
+    const std::vector<Packet> packets = Packets("vbs.flac");
+    ASSERT_EQ(frames.size(), packets.size());
+    for (size_t i = 0; i < frames.size(); ++i) EXPECT_EQ(frames[i].timeUs, packets[i].pts * 1000000 / 44100) << i;
 }
 
 TEST(FLACExtractorTest, PublishesTheDeviceBlocks) {

@@ -74,8 +74,8 @@ for f in u8_mono s16_stereo s24_mono s32_stereo f32_mono s24_ext_6ch items; do
 done
 fact items.wav items "wafm:0001fffe7fff umsg:hello-device rmod:vr180 bksz:4660"
 
-# FLAC: fixed block sizes 4096 and 1152, a 24-bit stream, and one with the
-# device's APPLICATION blocks.
+# FLAC: fixed block sizes 4096 and 1152, a 24-bit stream, one with the
+# device's APPLICATION blocks, and one with variable block sizes.
 sox -R "$(src 44100 2 1)" -b 16 "$tmp/s16.wav"
 flac -s -f --no-padding -b 4096 -o b4096.flac "$tmp/s16.wav"
 sox -R "$(src 22050 1 1)" -b 16 "$tmp/m16.wav"
@@ -83,7 +83,14 @@ flac -s -f --no-padding -b 1152 -o b1152.flac "$tmp/m16.wav"
 sox -R "$(src 48000 2 0.5)" -b 24 "$tmp/s24.wav"
 flac -s -f --no-padding -b 4096 -o s24.flac "$tmp/s24.wav"
 python3 "$here/audio_tool.py" flacitems b1152.flac items.flac
-for f in b4096 b1152 s24 items; do
+# Variable block sizes (sync code 0xFFF9), built by hand; both reference
+# decoders must take it and agree.
+python3 "$here/flac_vbs.py" vbs.flac
+flac -s -t vbs.flac
+flac -s -f -d --force-raw-format --endian=little --sign=signed -o "$tmp/vbs_flac.raw" vbs.flac
+ff -xerror -i vbs.flac -f s16le "$tmp/vbs_ff.raw"
+cmp "$tmp/vbs_flac.raw" "$tmp/vbs_ff.raw"
+for f in b4096 b1152 s24 items vbs; do
   f=$f.flac
   stream_facts "$f" > /dev/null
   flac -s -f -d --force-raw-format --endian=little --sign=signed -o "$tmp/raw" "$f"

@@ -50,6 +50,11 @@ have ffprobe && check "m4a holds aac only" bash -c "[ \"\$(ffprobe -v error -sho
 # trim FLAC through the frame converter
 check "trim flac" "$qnedit" --quiet trim "$samples/voice.flac" "$work/cut.flac" --start 1.2 --end 5
 have flac && check "trimmed flac passes flac -t" flac --test --silent "$work/cut.flac"
+# Frames of varying block sizes cannot be renumbered: refused, nothing written.
+vbs="$(dirname "$0")/../media/audio/vbs.flac"
+check "variable block size flac refused" expect_status 1 "$qnedit" trim "$vbs" "$work/vbs.flac" --start 0.1
+check "refusal names the cause" grep -q "variable block size" "$work/err.txt"
+check "refused trim leaves no output" test ! -e "$work/vbs.flac"
 # trim WAV exactly
 check "trim wav" "$qnedit" --quiet trim "$samples/music.wav" "$work/cut.wav" --start 1 --end 2.5
 have ffprobe && check "trimmed wav lasts 1.5 s" near "$(duration "$work/cut.wav")" 1.5 0.001

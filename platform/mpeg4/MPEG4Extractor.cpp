@@ -21,8 +21,11 @@ namespace {
 // The index is held in memory while it is parsed; real ones stay far below.
 constexpr uint64_t kMaxIndexBytes = 256 * 1024 * 1024;
 constexpr uint64_t kMaxUuidBytes = 16 * 1024 * 1024;
-// Files are a handful of boxes at the top; a long run of them is not an MP4.
+// Files are a handful of boxes at the top, and a fragmented one two more per
+// fragment (about two weeks of one-second fragments); a longer run of them
+// is not an MP4.
 constexpr int kMaxTopLevelBoxes = 4096;
+constexpr size_t kMaxFragments = 1u << 20;
 
 bool ReadMovieHeader(ByteReader r, uint32_t* timescale) {
     uint8_t version;
@@ -42,8 +45,9 @@ status_t MPEG4Extractor::readFile() {
         return ERROR_UNSUPPORTED;
     }
     bool haveMovie = false;
+    std::vector<std::pair<off64_t, mpeg4::BoxHeader>> fragments;  // each 'moof': where, how long
     off64_t offset = 0;
-    for (int boxes = 0; boxes < kMaxTopLevelBoxes && mFileSize - offset >= 8; ++boxes) {
+    for (int boxes = 0; boxes < kMaxTopLevelBoxes && mFileSize - offset >= 8;) {
         mpeg4::BoxHeader box;
         status_t err = mpeg4::ReadTopLevelBoxHeader(mDataSource, offset, mFileSize, &box);
         if (err != OK) {
@@ -61,9 +65,17 @@ status_t MPEG4Extractor::readFile() {
             if (!mDataSource->readExactly(offset + box.headerSize, moov.data(), moov.size())) return ERROR_IO;
             if ((err = readMovie(ByteReader(moov.data(), moov.size()))) != OK) return err;
             haveMovie = true;
+        } else if (box.type == FourCC('m', 'o', 'o', 'f') && !truncated) {
+            if (fragments.size() == kMaxFragments) {
+                ALOGW("more than %zu movie fragments", kMaxFragments);
+                return ERROR_MALFORMED;
+            }
+            fragments.emplace_back(offset, box);
         } else if (box.type == FourCC('u', 'u', 'i', 'd') && !truncated && mpeg4::IsSphereViewUuid(box.userType)) {
             readSphereView(offset + box.headerSize, box.payloadSize());
         }
+        // Fragments and their media data are not counted as stray boxes.
+        if (box.type != FourCC('m', 'o', 'o', 'f') && box.type != FourCC('m', 'd', 'a', 't')) ++boxes;
         if (truncated) break;
         offset += static_cast<off64_t>(box.size);
     }
@@ -71,6 +83,42 @@ status_t MPEG4Extractor::readFile() {
         ALOGW("no movie box");
         return ERROR_MALFORMED;
     }
+    status_t err = OK;
+    if (mFragments != nullptr && (err = readFragments(fragments)) != OK) return err;
+    return finishTracks();
+}
+
+status_t MPEG4Extractor::readFragments(const std::vector<std::pair<off64_t, mpeg4::BoxHeader>>& fragments) {
+    std::vector<uint8_t> moof;
+    for (const auto& f : fragments) {
+        if (f.second.payloadSize() > kMaxIndexBytes) {
+            return ERROR_MALFORMED;
+        }
+        moof.resize(f.second.payloadSize());
+        if (!mDataSource->readExactly(f.first + f.second.headerSize, moof.data(), moof.size())) return ERROR_IO;
+        const status_t err = mFragments->addFragment(ByteReader(moof.data(), moof.size()), f.first, mTracks);
+        if (err == ERROR_END_OF_STREAM) {
+            ALOGW("the file ends inside the media data of the fragment at %lld", (long long)f.first);
+            break;
+        }
+        if (err != OK) {
+            return err;
+        }
+    }
+    return OK;
+}
+
+status_t MPEG4Extractor::finishTracks() {
+    int64_t durationUs = 0;
+    for (const auto& track : mTracks) {
+        const status_t err = mpeg4::FinishTrack(mMovieTimescale, track.get());
+        if (err != OK) return err;
+        int64_t trackUs;
+        if (track->meta->findInt64(kKeyDuration, &trackUs)) durationUs = std::max(durationUs, trackUs);
+        if (track->isAudio) mItems.publishTrackItems(track->meta.get());
+    }
+    mFileMeta->setCString(kKeyMIMEType, MEDIA_MIMETYPE_CONTAINER_MPEG4);
+    mFileMeta->setInt64(kKeyDuration, durationUs);
     return OK;
 }
 
@@ -85,23 +133,16 @@ void MPEG4Extractor::readSphereView(off64_t offset, uint64_t size) {
 }
 
 status_t MPEG4Extractor::readMovie(const ByteReader& moov) {
-    uint32_t movieTimescale = 0;
     ByteReader box(nullptr, 0);
-    if (!mpeg4::FindChild(moov, FourCC('m', 'v', 'h', 'd'), &box) || !ReadMovieHeader(box, &movieTimescale)) {
+    if (!mpeg4::FindChild(moov, FourCC('m', 'v', 'h', 'd'), &box) || !ReadMovieHeader(box, &mMovieTimescale)) {
         ALOGW("no usable movie header");
         return ERROR_MALFORMED;
-    }
-    // Fragments would hold samples this extractor does not read; handing
-    // out the rest would silently cut the file short.
-    if (mpeg4::FindChild(moov, FourCC('m', 'v', 'e', 'x'), &box)) {
-        ALOGW("fragmented movie files are not supported");
-        return ERROR_UNSUPPORTED;
     }
     mpeg4::BoxIterator it(moov);
     while (it.next()) {
         if (it.header().type != FourCC('t', 'r', 'a', 'k')) continue;
         auto track = std::make_shared<mpeg4::Track>();
-        const status_t err = mpeg4::ParseTrack(it.payload(), movieTimescale, track.get());
+        const status_t err = mpeg4::ParseTrack(it.payload(), track.get());
         if (err == ERROR_UNSUPPORTED) continue;
         if (err != OK) return err;
         mTracks.push_back(track);
@@ -111,19 +152,18 @@ status_t MPEG4Extractor::readMovie(const ByteReader& moov) {
         ALOGW("no track this extractor can hand out");
         return ERROR_UNSUPPORTED;
     }
-
-    DeviceItems items;
+    // Samples that follow in movie fragments.
+    if (mpeg4::FindChild(moov, FourCC('m', 'v', 'e', 'x'), &box)) {
+        std::vector<mpeg4::TrackExtends> defaults;
+        if (!mpeg4::ReadMovieExtends(box, &defaults)) {
+            ALOGW("unusable fragment defaults");
+            return ERROR_MALFORMED;
+        }
+        mFragments.reset(new mpeg4::FragmentReader(std::move(defaults), uint64_t(mFileSize)));
+    }
     if (mpeg4::FindChild(moov, FourCC('u', 'd', 't', 'a'), &box)) {
-        mpeg4::ParseUserData(box, mFileMeta.get(), &items);
+        mpeg4::ParseUserData(box, mFileMeta.get(), &mItems);
     }
-    int64_t durationUs = 0;
-    for (const auto& track : mTracks) {
-        int64_t trackUs;
-        if (track->meta->findInt64(kKeyDuration, &trackUs)) durationUs = std::max(durationUs, trackUs);
-        if (track->isAudio) items.publishTrackItems(track->meta.get());
-    }
-    mFileMeta->setCString(kKeyMIMEType, MEDIA_MIMETYPE_CONTAINER_MPEG4);
-    mFileMeta->setInt64(kKeyDuration, durationUs);
     return OK;
 }
 

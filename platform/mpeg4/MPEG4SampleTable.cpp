@@ -174,13 +174,17 @@ status_t SampleTable::indexTimes() {
     if (!mTimeRuns.empty()) {
         const TimeRun& last = mTimeRuns.back();
         mEndDts = last.firstDts + static_cast<int64_t>((mCount - last.firstSample) * uint64_t(last.delta));
+        mLastDts = mEndDts - last.delta;
     }
 
     sample = 0;
     kept = 0;
     for (; kept < mOffsetRuns.size() && sample < mCount; ++kept) {
-        mOffsetRuns[kept].firstSample = sample;
-        sample += mOffsetRuns[kept].count;
+        OffsetRun& run = mOffsetRuns[kept];
+        run.firstSample = sample;
+        sample += run.count;
+        mMinCtsOffset = std::min(mMinCtsOffset, run.offset);
+        mMaxCtsOffset = std::max(mMaxCtsOffset, run.offset);
     }
     mOffsetRuns.resize(kept);
     return OK;
@@ -239,6 +243,154 @@ status_t SampleTable::finish() {
     return OK;
 }
 
+uint32_t SampleTable::syncPositionFrom(uint32_t index) const {
+    if (!mHaveSyncTable) return std::min(index, mCount);
+    return static_cast<uint32_t>(std::lower_bound(mSyncSamples.begin(), mSyncSamples.end(), index) -
+                                 mSyncSamples.begin());
+}
+
+uint32_t SampleTable::syncAtOrBefore(uint32_t index) const {
+    if (!mHaveSyncTable) return index;
+    auto it = std::upper_bound(mSyncSamples.begin(), mSyncSamples.end(), index);
+    // Without a sync sample before it, decoding can only start at the top.
+    return it == mSyncSamples.begin() ? 0 : *(it - 1);
+}
+
+uint32_t SampleTable::firstAtOrAfterDts(int64_t dts) const {
+    // Runs hold ascending times; within a run the time is linear.
+    auto it = std::upper_bound(mTimeRuns.begin(), mTimeRuns.end(), dts,
+                               [](int64_t t, const TimeRun& run) { return t < run.firstDts; });
+    if (it == mTimeRuns.begin()) return 0;
+    const TimeRun& run = *(it - 1);
+    const uint64_t runEnd = it == mTimeRuns.end() ? mCount : it->firstSample;
+    uint64_t k = run.delta == 0 ? (dts > run.firstDts ? runEnd - run.firstSample : 0)
+                                : (uint64_t(dts - run.firstDts) + run.delta - 1) / run.delta;
+    return static_cast<uint32_t>(std::min<uint64_t>(run.firstSample + k, runEnd));
+}
+
+// Fragments add to the tables in the widest form: 32-bit sizes, 64-bit
+// chunk offsets.
+void SampleTable::widenForAppending() {
+    if (mSizeBits != 32) {
+        std::vector<uint8_t> sizes;
+        sizes.reserve(size_t(mCount) * 4);
+        for (uint32_t i = 0; i < mCount; ++i) {
+            const uint32_t v = sampleSize(i);
+            const uint8_t b[4] = {uint8_t(v >> 24), uint8_t(v >> 16), uint8_t(v >> 8), uint8_t(v)};
+            sizes.insert(sizes.end(), b, b + 4);
+        }
+        mSizes.swap(sizes);
+        mSizeBits = 32;
+    }
+    if (mChunkOffsetBytes != 8) {
+        std::vector<uint8_t> offsets;
+        offsets.reserve(size_t(mChunkCount) * 8);
+        for (uint32_t c = 0; c < mChunkCount; ++c) {
+            const uint64_t v = chunkOffset(c);
+            for (int shift = 56; shift >= 0; shift -= 8) offsets.push_back(uint8_t(v >> shift));
+        }
+        mChunkOffsets.swap(offsets);
+        mChunkOffsetBytes = 8;
+    }
+}
+
+void SampleTable::appendTimes(uint32_t first, int64_t dts, const std::vector<FragmentSample>& samples) {
+    // A run of the movie box's table may list more samples than there are.
+    if (!mTimeRuns.empty()) {
+        TimeRun& last = mTimeRuns.back();
+        last.count = static_cast<uint32_t>(std::min<uint64_t>(last.count, first - last.firstSample));
+    }
+    for (size_t i = 0; i < samples.size(); ++i) {
+        const uint32_t delta = samples[i].duration;
+        TimeRun* last = mTimeRuns.empty() ? nullptr : &mTimeRuns.back();
+        if (last != nullptr && last->delta == delta &&
+            last->firstDts + int64_t(uint64_t(last->count) * delta) == dts) {
+            ++last->count;
+        } else {
+            mTimeRuns.push_back({first + i, dts, 1, delta});
+        }
+        mLastDts = dts;
+        dts += delta;
+    }
+    mEndDts = dts;
+}
+
+void SampleTable::appendOffsets(uint32_t first, const std::vector<FragmentSample>& samples) {
+    uint64_t covered = 0;
+    if (!mOffsetRuns.empty()) {
+        OffsetRun& last = mOffsetRuns.back();
+        last.count = static_cast<uint32_t>(std::min<uint64_t>(last.count, first - last.firstSample));
+        covered = last.firstSample + last.count;
+    }
+    bool any = !mOffsetRuns.empty();
+    for (const FragmentSample& s : samples) any = any || s.ctsOffset != 0;
+    if (!any) return;
+    // Samples the movie box's table leaves out have no offset.
+    if (covered < first) mOffsetRuns.push_back({covered, static_cast<uint32_t>(first - covered), 0});
+    for (size_t i = 0; i < samples.size(); ++i) {
+        const int32_t offset = samples[i].ctsOffset;
+        OffsetRun* last = mOffsetRuns.empty() ? nullptr : &mOffsetRuns.back();
+        if (last != nullptr && last->offset == offset && last->firstSample + last->count == first + i) {
+            ++last->count;
+        } else {
+            mOffsetRuns.push_back({first + i, 1, offset});
+        }
+        mMinCtsOffset = std::min(mMinCtsOffset, offset);
+        mMaxCtsOffset = std::max(mMaxCtsOffset, offset);
+    }
+}
+
+void SampleTable::appendSyncs(uint32_t first, const std::vector<FragmentSample>& samples) {
+    bool allSync = true;
+    for (const FragmentSample& s : samples) allSync = allSync && s.sync;
+    if (!mHaveSyncTable) {
+        if (allSync) return;
+        // Every sample so far was a sync sample; now the list is needed.
+        mSyncSamples.resize(first);
+        for (uint32_t i = 0; i < first; ++i) mSyncSamples[i] = i;
+        mHaveSyncTable = true;
+    }
+    for (size_t i = 0; i < samples.size(); ++i) {
+        if (samples[i].sync) mSyncSamples.push_back(static_cast<uint32_t>(first + i));
+    }
+}
+
+status_t SampleTable::appendRun(uint64_t offset, int64_t dts, const std::vector<FragmentSample>& samples) {
+    if (samples.empty()) return OK;
+    if (samples.size() > kMaxSamples - mCount) return Malformed("more samples than are held in memory");
+    uint64_t span = 0;
+    for (const FragmentSample& s : samples) span += s.duration;
+    if (mCount > 0 && dts <= mLastDts) dts = mEndDts;
+    if (dts < 0 || dts > kMaxTicks || span > uint64_t(kMaxTicks - dts)) return Malformed("decoding times overflow");
+    widenForAppending();
+
+    const uint32_t first = mCount;
+    appendTimes(first, dts, samples);
+    appendOffsets(first, samples);
+    appendSyncs(first, samples);
+
+    const uint32_t perChunk = static_cast<uint32_t>(samples.size());
+    ChunkRun* last = mChunkRuns.empty() ? nullptr : &mChunkRuns.back();
+    if (last != nullptr && last->samplesPerChunk == perChunk && last->chunkEnd == mChunkCount &&
+        last->firstSample + uint64_t(mChunkCount - last->firstChunk) * perChunk == first) {
+        ++last->chunkEnd;
+    } else {
+        mChunkRuns.push_back({first, mChunkCount, mChunkCount + 1, perChunk});
+    }
+    for (int shift = 56; shift >= 0; shift -= 8) mChunkOffsets.push_back(uint8_t(offset >> shift));
+    ++mChunkCount;
+
+    for (const FragmentSample& s : samples) {
+        const uint8_t b[4] = {uint8_t(s.size >> 24), uint8_t(s.size >> 16), uint8_t(s.size >> 8), uint8_t(s.size)};
+        mSizes.insert(mSizes.end(), b, b + 4);
+        mMaxSize = std::max(mMaxSize, s.size);
+        mTotalBytes += s.size;
+    }
+    mCount += perChunk;
+    mHaveSizes = mHaveChunks = mHaveSampleToChunk = mHaveTimes = true;
+    return OK;
+}
+
 namespace {
 // The last run starting at or before `sample`.
 template <typename Run>
@@ -293,11 +445,15 @@ void SampleCursor::advance() {
     ++mIndex;
     if (!valid()) return;
 
-    const SampleTable::TimeRun& time = t.mTimeRuns[mTimeRun];
-    mInfo.dts += time.delta;
-    if (++mTimeInRun == time.count) {
-        ++mTimeRun;
+    // Fragments start runs at their own decoding times, and a run of the
+    // movie box may list more samples than it holds before a fragment's.
+    const SampleTable::TimeRun* time = &t.mTimeRuns[mTimeRun];
+    mInfo.dts += time->delta;
+    if (mTimeRun + 1 < t.mTimeRuns.size() &&
+        (++mTimeInRun == time->count || t.mTimeRuns[mTimeRun + 1].firstSample == mIndex)) {
+        time = &t.mTimeRuns[++mTimeRun];
         mTimeInRun = 0;
+        mInfo.dts = time->firstDts;
     }
 
     if (mOffsetRun < t.mOffsetRuns.size() && ++mOffsetInRun == t.mOffsetRuns[mOffsetRun].count) {
@@ -307,7 +463,12 @@ void SampleCursor::advance() {
     mInfo.ctsOffset = mOffsetRun < t.mOffsetRuns.size() ? t.mOffsetRuns[mOffsetRun].offset : 0;
 
     const SampleTable::ChunkRun* chunks = &t.mChunkRuns[mChunkRun];
-    if (++mInChunk == chunks->samplesPerChunk) {
+    if (mChunkRun + 1 < t.mChunkRuns.size() && t.mChunkRuns[mChunkRun + 1].firstSample == mIndex) {
+        chunks = &t.mChunkRuns[++mChunkRun];
+        mInChunk = 0;
+        mChunk = chunks->firstChunk;
+        mInfo.offset = t.chunkOffset(mChunk);
+    } else if (++mInChunk == chunks->samplesPerChunk) {
         mInChunk = 0;
         if (++mChunk == chunks->chunkEnd) {
             chunks = &t.mChunkRuns[++mChunkRun];

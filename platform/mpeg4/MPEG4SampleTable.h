@@ -18,11 +18,23 @@ struct SampleInfo {
     bool sync = false;
 };
 
+// One sample of a track fragment run, as its 'trun' and defaults give it.
+struct FragmentSample {
+    uint32_t size = 0;
+    uint32_t duration = 0;
+    int32_t ctsOffset = 0;
+    bool sync = false;
+};
+
 // The sample tables of one track (ISO/IEC 14496-12, 8.6 and 8.7), kept in the
 // compact form the file stores them in: what is held grows with the tables'
 // size in the file, never with a count the file merely claims.
 class SampleTable {
 public:
+    // Fragments add samples one by one; past this a track is refused rather
+    // than held (ten hours of 48 kHz AAC is 1.7 million samples).
+    static constexpr uint32_t kMaxSamples = 1u << 23;
+
     // Each takes the box payload and refuses one whose entries do not fit it.
     status_t setSampleSizes(uint32_t type, ByteReader payload);   // 'stsz' or 'stz2'
     status_t setChunkOffsets(uint32_t type, ByteReader payload);  // 'stco' or 'co64'
@@ -33,6 +45,12 @@ public:
     // Checks that the tables agree and indexes the runs; ERROR_MALFORMED when
     // a table is missing or cannot describe every sample.
     status_t finish();
+    // Adds the samples of one track fragment run (ISO/IEC 14496-12, 8.8.8)
+    // after a finished table: they lie back to back from `offset` and the
+    // first is decoded at `dts`, or where the table ends when `dts` would go
+    // back in time. ERROR_MALFORMED when times overflow or the track grows
+    // past what is held in memory.
+    status_t appendRun(uint64_t offset, int64_t dts, const std::vector<FragmentSample>& samples);
 
     uint32_t count() const { return mCount; }
     uint32_t sampleSize(uint32_t index) const;
@@ -43,6 +61,15 @@ public:
     // Sync samples in order; every sample when the track has no sync table.
     uint32_t syncCount() const { return mHaveSyncTable ? uint32_t(mSyncSamples.size()) : mCount; }
     uint32_t syncSample(uint32_t k) const { return mHaveSyncTable ? mSyncSamples[k] : k; }
+    // Position among the sync samples of the first one at or after `index`
+    // (syncCount() when none), and the last sync sample at or before it.
+    uint32_t syncPositionFrom(uint32_t index) const;
+    uint32_t syncAtOrBefore(uint32_t index) const;
+    // The first sample decoded at or after `dts`; count() when none.
+    uint32_t firstAtOrAfterDts(int64_t dts) const;
+    // Bounds of the composition offsets, 0 included.
+    int32_t minCtsOffset() const { return mMinCtsOffset; }
+    int32_t maxCtsOffset() const { return mMaxCtsOffset; }
 
 private:
     friend class SampleCursor;
@@ -68,6 +95,10 @@ private:
     uint64_t chunkOffset(uint32_t chunk) const;
     status_t indexTimes();
     status_t indexChunks();
+    void widenForAppending();
+    void appendTimes(uint32_t first, int64_t dts, const std::vector<FragmentSample>& samples);
+    void appendOffsets(uint32_t first, const std::vector<FragmentSample>& samples);
+    void appendSyncs(uint32_t first, const std::vector<FragmentSample>& samples);
 
     uint32_t mCount = 0;
     bool mHaveSizes = false;
@@ -91,6 +122,9 @@ private:
     uint32_t mMaxSize = 0;
     uint64_t mTotalBytes = 0;
     int64_t mEndDts = 0;
+    int64_t mLastDts = 0;
+    int32_t mMinCtsOffset = 0;
+    int32_t mMaxCtsOffset = 0;
 };
 
 // Walks a finished table: seek() to any sample, advance() to the next one in

@@ -11,9 +11,9 @@
 
 namespace android {
 
-// The samples of one MP4 track, read from the file one at a time: memory
-// per read is the sample's size (twice that when NAL prefixes shorter than a
-// start code make the sample grow).
+// The samples of one MP4 track, read from the file one at a time in the order
+// its edit list plays them: memory per read is the sample's size (twice that
+// when NAL prefixes shorter than a start code make the sample grow).
 class MPEG4Source : public TrackSource {
 public:
     // The media editor's status for a sample with a broken NAL unit; it skips
@@ -33,12 +33,19 @@ protected:
     status_t readNext(MediaBufferBase** buffer) override;
 
 private:
-    int64_t syncTimeUs(uint32_t k) const;
+    // The sync samples of all segments in play order, numbered from 0.
+    uint64_t syncCount() const { return mSyncBase.back(); }
+    void syncAt(uint64_t position, size_t* segment, uint32_t* sample) const;
+    int64_t syncTimeUs(uint64_t position) const;
+    void startSegment(size_t segment, uint32_t sample);
     status_t readSample(const mpeg4::SampleInfo& sample, int64_t timeUs, MediaBuffer** buffer);
 
     const sp<DataSource> mDataSource;
     const std::shared_ptr<const mpeg4::Track> mTrack;
     const off64_t mFileSize;
+    // Sync positions before each segment, and their total at the end.
+    std::vector<uint64_t> mSyncBase;
+    size_t mSegment = 0;
     mpeg4::SampleCursor mCursor;
     int64_t mTargetTimeUs = -1;
     std::vector<uint8_t> mScratch;

@@ -86,56 +86,6 @@ bool ReadMediaHeader(ByteReader r, MediaHeader* h) {
     return true;
 }
 
-struct EditList {
-    int64_t mediaStartTicks = 0;
-    uint64_t emptyTicks = 0;    // movie timescale
-    uint64_t totalTicks = 0;    // movie timescale
-};
-
-// Honours leading empty edits and the first edit's media time, which is how
-// encoder delay and the first composition offset are expressed; later edits
-// are not applied.
-status_t ReadEditList(ByteReader r, EditList* edits) {
-    uint8_t version;
-    uint32_t flags, count;
-    if (!ReadFullBoxHeader(&r, &version, &flags) || !r.be32(&count)) return Malformed("short elst");
-    const uint64_t entryBytes = version == 1 ? 20 : 12;
-    if (!r.has(uint64_t(count) * entryBytes)) return Malformed("more edits than the box holds");
-    bool started = false;
-    uint32_t ignored = 0;
-    for (uint32_t i = 0; i < count; ++i) {
-        uint64_t duration = 0;
-        int64_t mediaTime;
-        if (version == 1) {
-            uint64_t t = 0;
-            r.be64(&duration);
-            r.be64(&t);
-            mediaTime = static_cast<int64_t>(t);
-        } else {
-            uint32_t d = 0, t = 0;
-            r.be32(&d);
-            r.be32(&t);
-            duration = d;
-            mediaTime = static_cast<int32_t>(t);
-        }
-        r.skip(4);  // media rate
-        if (duration > uint64_t(kMaxTime) || edits->totalTicks + duration > uint64_t(kMaxTime)) {
-            return Malformed("edit durations overflow");
-        }
-        edits->totalTicks += duration;
-        if (started) {
-            if (mediaTime != -1) ++ignored;
-        } else if (mediaTime == -1) {
-            edits->emptyTicks += duration;
-        } else if (mediaTime >= 0 && mediaTime <= kMaxTime) {
-            edits->mediaStartTicks = mediaTime;
-            started = true;
-        }
-    }
-    if (ignored > 0) ALOGW("%u later edits not applied", ignored);
-    return OK;
-}
-
 status_t ReadSampleTables(const ByteReader& stbl, SampleTable* table) {
     struct {
         uint32_t type;
@@ -180,7 +130,7 @@ int64_t SignedTicksToUs(int64_t ticks, uint32_t timescale) {
     return static_cast<int64_t>(us);
 }
 
-status_t ParseTrack(const ByteReader& trak, uint32_t movieTimescale, Track* track) {
+status_t ParseTrack(const ByteReader& trak, Track* track) {
     ByteReader box(nullptr, 0), mdia(nullptr, 0), minf(nullptr, 0), stbl(nullptr, 0);
     TrackHeader tkhd;
     if (!FindChild(trak, FourCC('t', 'k', 'h', 'd'), &box) || !ReadTrackHeader(box, &tkhd)) {
@@ -209,41 +159,50 @@ status_t ParseTrack(const ByteReader& trak, uint32_t movieTimescale, Track* trac
     if (err != OK) return err;
     if ((err = ReadSampleTables(stbl, &track->table)) != OK) return err;
 
-    const SampleTable& table = track->table;
-    if (table.maxSampleSize() > kMaxSampleSize) return Malformed("sample larger than 64 MB");
+    ByteReader edts(nullptr, 0);
+    if (FindChild(trak, FourCC('e', 'd', 't', 's'), &edts) && FindChild(edts, FourCC('e', 'l', 's', 't'), &box) &&
+        (err = ReadEditList(box, &track->edits)) != OK) {
+        return err;
+    }
+    track->trackId = tkhd.trackId;
     track->timescale = mdhd.timescale;
     track->nalLengthSize = codec.nalLengthSize;
     track->isAudio = codec.isAudio;
-
-    EditList edits;
-    ByteReader edts(nullptr, 0);
-    if (FindChild(trak, FourCC('e', 'd', 't', 's'), &edts) && FindChild(edts, FourCC('e', 'l', 's', 't'), &box)) {
-        if ((err = ReadEditList(box, &edits)) != OK) return err;
-        track->mediaStartTicks = edits.mediaStartTicks;
-        track->emptyEditUs = SignedTicksToUs(static_cast<int64_t>(edits.emptyTicks), movieTimescale);
-    }
-
-    int64_t durationUs;
-    if (edits.totalTicks > 0 && movieTimescale > 0) {
-        durationUs = SignedTicksToUs(static_cast<int64_t>(edits.totalTicks), movieTimescale);
-    } else if (mdhd.duration > 0 && mdhd.duration <= uint64_t(kMaxTime)) {
-        durationUs = SignedTicksToUs(static_cast<int64_t>(mdhd.duration), mdhd.timescale);
-    } else {
-        durationUs = SignedTicksToUs(table.endDts(), mdhd.timescale);
-    }
+    track->mediaDuration = mdhd.duration <= uint64_t(kMaxTime) ? mdhd.duration : 0;
+    track->avgBitrate = codec.avgBitrate;
     meta->setInt32(kKeyTrackID, static_cast<int32_t>(tkhd.trackId));
-    meta->setInt64(kKeyDuration, durationUs);
     meta->setCString(kKeyMediaLanguage, mdhd.language);
     if (codec.isVideo && tkhd.rotation != 0) meta->setInt32(kKeyRotation, tkhd.rotation);
+    return OK;
+}
+
+status_t FinishTrack(uint32_t movieTimescale, Track* track) {
+    const SampleTable& table = track->table;
+    if (table.maxSampleSize() > kMaxSampleSize) return Malformed("sample larger than 64 MB");
+    EditLayout layout;
+    const status_t err =
+        LayOutEdits(track->edits, movieTimescale, track->timescale, table, track->isAudio, &layout);
+    if (err != OK) return err;
+    track->segments = std::move(layout.segments);
+    std::vector<Edit>().swap(track->edits);
+
+    int64_t durationUs = layout.durationUs;
+    if (durationUs < 0) {
+        durationUs = track->mediaDuration > 0 ? SignedTicksToUs(static_cast<int64_t>(track->mediaDuration), track->timescale)
+                                              : SignedTicksToUs(table.endDts(), track->timescale);
+    }
+    MetaData* meta = track->meta.get();
+    meta->setInt64(kKeyDuration, durationUs);
 
     // A start code is 4 bytes, so shorter length prefixes grow the sample.
     uint64_t maxInput = table.maxSampleSize();
-    if (codec.nalLengthSize > 0) maxInput = (maxInput * 4 + codec.nalLengthSize - 1) / codec.nalLengthSize;
+    const uint32_t lengthSize = track->nalLengthSize;
+    if (lengthSize > 0) maxInput = (maxInput * 4 + lengthSize - 1) / lengthSize;
     meta->setInt32(kKeyMaxInputSize, ClampToInt32(maxInput));
 
-    const int64_t mediaUs = SignedTicksToUs(table.endDts(), mdhd.timescale);
-    if (codec.avgBitrate > 0) {
-        meta->setInt32(kKeyBitRate, ClampToInt32(codec.avgBitrate));
+    const int64_t mediaUs = SignedTicksToUs(table.endDts(), track->timescale);
+    if (track->avgBitrate > 0) {
+        meta->setInt32(kKeyBitRate, ClampToInt32(track->avgBitrate));
     } else if (mediaUs > 0) {
         const __int128 bits = static_cast<__int128>(table.totalBytes()) * 8 * 1000000 / mediaUs;
         meta->setInt32(kKeyBitRate, bits > INT32_MAX ? INT32_MAX : static_cast<int32_t>(bits));

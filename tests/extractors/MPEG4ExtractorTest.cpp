@@ -255,7 +255,9 @@ TEST_P(MPEG4FileTest, SeekModesLandOnTheRightSyncSample) {
 
 INSTANTIATE_TEST_SUITE_P(Files, MPEG4FileTest,
                          ::testing::Values("avc_aac.mp4", "avc_aac_faststart.mp4", "avc_aac.mov", "hevc.mp4", "aac.m4a",
-                                           "avc_rotated.mp4", "amr_nb.3gp"),
+                                           "avc_rotated.mp4", "amr_nb.3gp", "frag_empty_moov.mp4",
+                                           "frag_base_moof.mp4", "frag_dash.mp4", "frag_hevc.mp4", "frag_gst.mp4",
+                                           "frag_mediabunny.mp4"),
                          [](const ::testing::TestParamInfo<const char*>& info) {
                              std::string name = info.param;
                              for (char& c : name) {

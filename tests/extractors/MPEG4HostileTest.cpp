@@ -156,17 +156,6 @@ TEST(MPEG4HostileTest, ImpossibleHeadersAreRefused) {
     EXPECT_EQ(nullptr, OpenBytes(bad));
 }
 
-TEST(MPEG4HostileTest, FragmentedFilesAreRefusedRatherThanCutShort) {
-    File f = SmallFile();
-    f.moovFirst = false;
-    std::string file = Build(f);
-    const size_t moov = FindBox(file, "moov");
-    ASSERT_EQ(file.size(), moov + Be32At(file, moov));
-    file += Box("mvex", FullBox("trex", 0, 0, BE32(1) + BE32(1) + BE32(0) + BE32(0) + BE32(0)));
-    Put32(&file, moov, uint32_t(file.size() - moov));
-    EXPECT_EQ(nullptr, OpenBytes(file));
-}
-
 TEST(MPEG4HostileTest, NonFilesAreNotSniffed) {
     for (const std::string& bytes :
          {std::string(), std::string("\0\0\0\x08", 4), std::string(4096, '\0'), std::string("RIFF\0\0\0\0WAVE", 12),

@@ -4,6 +4,8 @@
 // Builds small MP4 files in memory, box by box, so tests can shape every
 // table (and break it) without binary fixtures.
 
+#include <algorithm>
+#include <climits>
 #include <cstdint>
 #include <string>
 #include <vector>
@@ -171,6 +173,96 @@ inline std::string Build(const File& f) {
     const std::string moov = Movie(f, bases);
     const std::string mdat = Box("mdat", media);
     return ftyp + (f.moovFirst ? moov + mdat : mdat + moov) + f.trailing;
+}
+
+// Fragmented layouts (ISO/IEC 14496-12, 8.8): an empty movie box with 'mvex',
+// then a 'moof' and an 'mdat' per group of samples of every track.
+struct Fragmenting {
+    size_t samplesPerFragment = 2;
+    // Where a track fragment's offsets count from.
+    enum Base { kFirstAtMoof, kExplicit, kDefaultBaseIsMoof } base = kFirstAtMoof;
+    uint8_t trunVersion = 0;
+    // Durations and sizes from 'trex', flags from 'tfhd' with the first
+    // sample's in the 'trun' (samples must then share their size and
+    // duration, and only the first of each fragment be a sync sample).
+    bool defaultsOnly = false;
+    uint64_t tfdtGap = 0;      // ticks added to each later fragment's decode time
+    std::string afterMoov;     // top-level boxes before the first fragment
+};
+
+constexpr uint32_t kSyncFlags = 0x02000000, kNonSyncFlags = 0x01010000;
+
+inline std::string TrackFragment(const Track& t, uint32_t id, size_t first, size_t end, uint64_t dts,
+                                 const Fragmenting& how, uint64_t base, int32_t dataOffset) {
+    uint32_t tfhdFlags = how.base == Fragmenting::kExplicit ? 0x1 : how.base == Fragmenting::kDefaultBaseIsMoof ? 0x20000 : 0;
+    std::string tfhd = BE32(id);
+    if (tfhdFlags & 0x1) tfhd += BE64(base);
+    uint32_t trunFlags = dataOffset != INT32_MIN ? 0x1 : 0;
+    std::string samples;
+    if (how.defaultsOnly) {
+        tfhdFlags |= 0x20;
+        tfhd += BE32(kNonSyncFlags);
+        trunFlags |= 0x4;
+    } else {
+        trunFlags |= 0xF00;
+        for (size_t i = first; i < end; ++i) {
+            const Sample& s = t.samples[i];
+            samples += BE32(s.duration) + BE32(uint32_t(s.bytes.size())) + BE32(s.sync ? kSyncFlags : kNonSyncFlags) +
+                       BE32(uint32_t(s.ctsOffset));
+        }
+    }
+    std::string trun = BE32(uint32_t(end - first));
+    if (trunFlags & 0x1) trun += BE32(uint32_t(dataOffset));
+    if (trunFlags & 0x4) trun += BE32(kSyncFlags);
+    return Box("traf", FullBox("tfhd", 0, tfhdFlags, tfhd) + FullBox("tfdt", 1, 0, BE64(dts)) +
+                           FullBox("trun", how.trunVersion, trunFlags, trun + samples));
+}
+
+inline std::string BuildFragmented(const File& f, const Fragmenting& how) {
+    const std::string ftyp = Box("ftyp", std::string("iso6") + BE32(0) + "iso6mp41");
+    File empty = f;
+    std::string mvex;
+    for (size_t i = 0; i < f.tracks.size(); ++i) {
+        empty.tracks[i].samples.clear();
+        const Sample& s = f.tracks[i].samples.front();
+        const uint32_t duration = how.defaultsOnly ? s.duration : 0, size = how.defaultsOnly ? uint32_t(s.bytes.size()) : 0;
+        mvex += FullBox("trex", 0, 0, BE32(uint32_t(i + 1)) + BE32(1) + BE32(duration) + BE32(size) + BE32(0));
+    }
+    std::string moov = Movie(empty, std::vector<uint64_t>(f.tracks.size(), 0));
+    moov = Box("moov", moov.substr(8) + Box("mvex", mvex));
+    std::string out = ftyp + moov + how.afterMoov;
+
+    size_t fragments = 0;
+    for (const Track& t : f.tracks) fragments = std::max(fragments, (t.samples.size() + how.samplesPerFragment - 1) / how.samplesPerFragment);
+    std::vector<uint64_t> dts(f.tracks.size(), 0);
+    for (size_t k = 0; k < fragments; ++k) {
+        // Offsets do not change the sizes of the boxes, so lay out twice.
+        std::string moof, media;
+        for (int pass = 0; pass < 2; ++pass) {
+            const uint64_t moofSize = moof.size(), mediaStart = out.size() + moofSize + 8;
+            std::string trafs;
+            media.clear();
+            for (size_t i = 0; i < f.tracks.size(); ++i) {
+                const Track& t = f.tracks[i];
+                const size_t first = std::min(t.samples.size(), k * how.samplesPerFragment);
+                const size_t end = std::min(t.samples.size(), first + how.samplesPerFragment);
+                if (first == end) continue;
+                const bool firstTraf = trafs.empty();
+                int32_t dataOffset = INT32_MIN;  // none: the data follows the previous track fragment's
+                if (how.base == Fragmenting::kDefaultBaseIsMoof) dataOffset = int32_t(moofSize + 8 + media.size());
+                if (how.base == Fragmenting::kFirstAtMoof && firstTraf) dataOffset = int32_t(moofSize + 8);
+                trafs += TrackFragment(t, uint32_t(i + 1), first, end, dts[i] + k * how.tfdtGap, how, mediaStart + media.size(),
+                                       dataOffset);
+                for (size_t j = first; j < end; ++j) media += t.samples[j].bytes;
+                if (pass == 1) {
+                    for (size_t j = first; j < end; ++j) dts[i] += t.samples[j].duration;
+                }
+            }
+            moof = Box("moof", FullBox("mfhd", 0, 0, BE32(uint32_t(k + 1))) + trafs);
+        }
+        out += moof + Box("mdat", media);
+    }
+    return out;
 }
 
 // An AVC sample of NAL units with `lengthSize`-byte prefixes.

@@ -48,7 +48,8 @@ int64_t Mp4UsToTicks(int64_t us, uint32_t timescale) { return rescale(us, 100000
 int64_t Mp4TicksToUs(int64_t ticks, uint32_t timescale) { return rescale(ticks, timescale, 1000000); }
 
 status_t Mp4TrackTiming::compute(const std::vector<int64_t>& dtsUs, const std::vector<int64_t>& ptsUs,
-                                 const std::vector<uint32_t>& candidates, int64_t lastDurationUs) {
+                                 const std::vector<uint32_t>& candidates, int64_t lastDurationUs,
+                                 const Mp4TrackBounds& bounds) {
     if (dtsUs.empty() || dtsUs.size() != ptsUs.size() || candidates.empty()) return BAD_VALUE;
     bool usable = true;
     for (size_t i = 0; i < dtsUs.size() && usable; ++i) {
@@ -63,7 +64,7 @@ status_t Mp4TrackTiming::compute(const std::vector<int64_t>& dtsUs, const std::v
     const std::vector<int64_t>& dts = rebuiltDecodingTimes ? rebuilt : dtsUs;
     for (bool exact : {true, false}) {
         for (uint32_t ts : candidates) {
-            if (tryTimescale(dts, ptsUs, ts, lastDurationUs, exact)) return OK;
+            if (tryTimescale(dts, ptsUs, ts, lastDurationUs, bounds, exact)) return OK;
         }
     }
     ALOGE("sample times span more than the track tables can hold");
@@ -71,7 +72,8 @@ status_t Mp4TrackTiming::compute(const std::vector<int64_t>& dtsUs, const std::v
 }
 
 bool Mp4TrackTiming::tryTimescale(const std::vector<int64_t>& dtsUs, const std::vector<int64_t>& ptsUs,
-                                  uint32_t ts, int64_t lastDurationUs, bool requireExact) {
+                                  uint32_t ts, int64_t lastDurationUs, const Mp4TrackBounds& bounds,
+                                  bool requireExact) {
     const size_t n = dtsUs.size();
     std::vector<int64_t> d(n), p(n);
     for (size_t i = 0; i < n; ++i) {
@@ -89,11 +91,13 @@ bool Mp4TrackTiming::tryTimescale(const std::vector<int64_t>& dtsUs, const std::
 
     int64_t shift = 0;
     int64_t firstShown = p[0];
+    int64_t firstFromZero = INT64_MAX;
     int64_t end = p[0];
     for (size_t i = 0; i < n; ++i) {
         if (durations[i] > UINT32_MAX) return false;
         shift = std::max(shift, d[i] - p[i]);
         firstShown = std::min(firstShown, p[i]);
+        if (p[i] >= 0) firstFromZero = std::min(firstFromZero, p[i]);
         end = std::max(end, p[i] + durations[i]);
     }
     std::vector<Run> decoding, offsets;
@@ -111,11 +115,18 @@ bool Mp4TrackTiming::tryTimescale(const std::vector<int64_t>& dtsUs, const std::
     stts = std::move(decoding);
     ctts = anyOffset ? std::move(offsets) : std::vector<Run>();
     mediaDuration = total;
-    const int64_t shownStart = std::max<int64_t>(0, firstShown);
+    int64_t shownStart = std::max<int64_t>(0, firstShown);
+    if (bounds.startsOnSample && firstFromZero != INT64_MAX) shownStart = firstFromZero;
+    const int64_t endTicks = bounds.endUs >= 0 ? Mp4UsToTicks(bounds.endUs, ts) : end;
+    // Only a track that ends as a trim leaves it, its last stored sample shown
+    // before the bound, is cut there; a longer track (a format's duration
+    // carried over from elsewhere) is shown whole.
+    const bool clipped = endTicks > shownStart && endTicks < end && p[n - 1] < endTicks;
+    if (clipped) end = endTicks;
     startUs = Mp4TicksToUs(shownStart, ts);
     mediaTime = shownStart - d[0] + shift;
     shownTicks = end > shownStart ? static_cast<uint64_t>(end - shownStart) : 0;
-    needsEdit = shownStart > 0 || mediaTime != 0;
+    needsEdit = shownStart > 0 || mediaTime != 0 || clipped;
     return true;
 }
 

@@ -15,6 +15,14 @@ class Mp4BoxWriter;
 int64_t Mp4UsToTicks(int64_t us, uint32_t timescale);
 int64_t Mp4TicksToUs(int64_t ticks, uint32_t timescale);
 
+// What narrows a track's presentation besides its samples' times.
+struct Mp4TrackBounds {
+    // Where the presentation stops at the latest (< 0: none); applied when
+    // the last sample stored is presented before it.
+    int64_t endUs = -1;
+    bool startsOnSample = false;  // video: start on the first frame presented from 0 on
+};
+
 // The timing of one track as stored: decoding deltas (stts), composition
 // offsets (ctts) and the edit that presents it.
 //
@@ -28,6 +36,13 @@ int64_t Mp4TicksToUs(int64_t ticks, uint32_t timescale);
 // presentation time, the whole decoding time line is moved earlier and the
 // edit's media time takes the shift back out, so presentation times stay
 // exact.
+//
+// Bounds can narrow that: an end on the movie time line, past which samples
+// kept only as references (a P-frame stored before the B-frames shown before
+// the end) are decoded but hidden; and for video a start on a frame: a frame
+// that would be shown from before time 0 is hidden and an empty edit covers
+// the time until the next one, so exactly the frames presented from 0 on are
+// shown.
 //
 // Decoding times are kept when they increase strictly and never pass the
 // presentation time; otherwise (generated times running ahead of B-frames,
@@ -54,10 +69,12 @@ struct Mp4TrackTiming {
 
     // `candidates`: time scales in order of preference; the first in which
     // every time is exact to the microsecond and every table value fits is
-    // taken (else the first that fits). `lastDurationUs` is the duration of
-    // the last sample when there is no earlier delta to repeat.
+    // taken (else the first that fits, times rounded to its ticks).
+    // `lastDurationUs` is the duration of the last sample when there is no
+    // earlier delta to repeat.
     status_t compute(const std::vector<int64_t>& dtsUs, const std::vector<int64_t>& ptsUs,
-                     const std::vector<uint32_t>& candidates, int64_t lastDurationUs);
+                     const std::vector<uint32_t>& candidates, int64_t lastDurationUs,
+                     const Mp4TrackBounds& bounds = Mp4TrackBounds());
 
     void writeDecodingTimes(Mp4BoxWriter& w) const;     // stts
     void writeCompositionOffsets(Mp4BoxWriter& w) const;  // ctts, when needed
@@ -68,7 +85,7 @@ struct Mp4TrackTiming {
 
 private:
     bool tryTimescale(const std::vector<int64_t>& dtsUs, const std::vector<int64_t>& ptsUs,
-                      uint32_t ts, int64_t lastDurationUs, bool requireExact);
+                      uint32_t ts, int64_t lastDurationUs, const Mp4TrackBounds& bounds, bool requireExact);
 };
 
 }  // namespace android

@@ -69,6 +69,10 @@ Mp4TrackWriter::Mp4TrackWriter(Codec codec, const sp<MetaData>& format) : mCodec
     format->findInt32(kKeyWidth, &mWidth);
     format->findInt32(kKeyHeight, &mHeight);
     format->findInt32(kKeyFrameRate, &mFrameRate);
+    // The track's duration bounds its presentation: a trim keeps the frames
+    // after its end that earlier frames refer to, and they stay hidden.
+    int64_t durationUs = 0;
+    if (format->findInt64(kKeyDuration, &durationUs) && durationUs > 0) mEndUs = durationUs;
     int32_t v = 0;
     if (format->findInt32(kKeySampleRate, &v) && v > 0) mSampleRate = static_cast<uint32_t>(v);
     if (format->findInt32(kKeyChannelCount, &v) && v > 0) mChannels = static_cast<uint32_t>(v);
@@ -252,16 +256,23 @@ status_t Mp4TrackWriter::finish() {
             return ERROR_MALFORMED;
         }
     }
+    // Audio counts in samples, times off that grid rounded to it: players
+    // start the audio late when its edit's media time is not a whole number
+    // of samples (as with a 1 MHz time scale).
     std::vector<uint32_t> candidates;
     if (isVideo()) {
-        candidates.push_back(90000);
+        candidates = {90000, 1000000};
     } else if (mSampleRate > 0) {
-        candidates.push_back(mSampleRate);
+        candidates = {mSampleRate};
+    } else {
+        candidates = {1000000};
     }
-    candidates.push_back(1000000);
     std::vector<int64_t> dts, pts;
     mTables.times(&dts, &pts);
-    const status_t err = mTiming.compute(dts, pts, candidates, defaultDurationUs());
+    Mp4TrackBounds bounds;
+    bounds.endUs = mEndUs;
+    bounds.startsOnSample = isVideo();
+    const status_t err = mTiming.compute(dts, pts, candidates, defaultDurationUs(), bounds);
     if (err == OK && mTiming.rebuiltDecodingTimes) {
         ALOGW("decoding times out of order or after presentation; rebuilt from presentation times");
     }

@@ -70,6 +70,7 @@ private:
     uint32_t mSampleRate = 0;
     uint32_t mChannels = 0;
     int32_t mFrameRate = 0;
+    int64_t mEndUs = -1;             // where the presentation stops, when given
 
     std::vector<uint8_t> mRecord;    // avcC/hvcC record or AAC AudioSpecificConfig
     size_t mLengthSize = 4;          // NAL length size of the stored samples

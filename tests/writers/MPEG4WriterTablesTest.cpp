@@ -110,6 +110,50 @@ TEST(MPEG4WriterTiming, TimescaleEditsAndRounding) {
     EXPECT_EQ(INT64_C(9000000000000000000), Mp4TicksToUs(INT64_C(810000000000000000), 90000));
 }
 
+TEST(MPEG4WriterTiming, BoundsShowExactlyWhatATrimAskedFor) {
+    // 25 fps at 90 kHz, in decoding order. A trim ending at 100 ms keeps the
+    // P-frame at 120 ms that the B-frames at 40 and 80 ms refer to.
+    const std::vector<int64_t> ipbb = {0, 120000, 40000, 80000};
+    struct Case {
+        const char* what;
+        std::vector<int64_t> pts;
+        Mp4TrackBounds bounds;
+        int64_t startUs;
+        int64_t mediaTime;    // ticks of the track's time scale
+        uint64_t shownTicks;
+    };
+    const Case cases[] = {
+        {"no bounds: everything shown", ipbb, {}, 0, 0, 14400},
+        {"end hides the reference after it", ipbb, {100000, false}, 0, 0, 9000},
+        {"end past every sample changes nothing", ipbb, {400000, false}, 0, 0, 14400},
+        {"a sample stored after the last one shown before the end: not a trim, shown whole",
+         {0, 120000, 40000, 80000, 160000}, {100000, false}, 0, 0, 18000},
+        {"a frame shown from before 0 is hidden, an empty edit up to the next",
+         {-10000, 30000, 70000}, {-1, true}, 30000, 3600, 7200},
+        {"without the start on a frame the first frame shows from 0", {-10000, 30000, 70000}, {}, 0, 900, 9900},
+    };
+    for (const Case& c : cases) {
+        SCOPED_TRACE(c.what);
+        std::vector<int64_t> dts(c.pts.size());
+        for (size_t i = 0; i < dts.size(); ++i) dts[i] = c.pts.front() + int64_t(i) * 40000 - 40000;
+        Mp4TrackTiming t;
+        ASSERT_EQ(OK, t.compute(dts, c.pts, {90000}, 40000, c.bounds));
+        EXPECT_EQ(c.startUs, t.startUs);
+        EXPECT_EQ(c.mediaTime, t.mediaTime - 3600);  // less the one-frame decoding lead
+        EXPECT_EQ(c.shownTicks, t.shownTicks);
+    }
+
+    // Audio off its sample grid (a cut 10 ms before a frame) is rounded to the
+    // grid and hides the pre-roll by a whole number of samples.
+    Mp4TrackTiming aac;
+    const std::vector<int64_t> times = {-10000, 13220, 36440, 59660};
+    ASSERT_EQ(OK, aac.compute(times, times, {44100}, 23220));
+    EXPECT_EQ(44100u, aac.timescale);
+    ASSERT_EQ(1u, aac.stts.size());
+    EXPECT_EQ(1024u, aac.stts[0].value);
+    EXPECT_EQ(441, aac.mediaTime);
+}
+
 TEST(MPEG4WriterTables, ChunksSizesSyncAndWideOffsets) {
     Mp4TrackTables t;
     // Two chunks of two samples, then a chunk of one beyond 4 GiB.

@@ -15,6 +15,7 @@
 #include "MuxerOutput.h"
 #include "OutputFile.h"
 #include "Progress.h"
+#include "TrimWindow.h"
 #include "QNMediaFlacFrameConverter.h"
 #include "QNMediaMuxer.h"
 
@@ -131,6 +132,8 @@ struct TrackState {
     int frameBytes = 0;   // PCM: bytes per sample frame as delivered
     int sampleRate = 0;   // PCM
     sp<QNMediaFlacFrameConverter> flac;
+    int64_t prerollUs = 0;
+    TrimWindow window;
 };
 
 // PCM is cut to the exact sample frame; the buffer is trimmed in place.
@@ -170,6 +173,8 @@ int runTrim(const std::vector<std::string>& words) {
     if (muxer->getMuxerState() != QNMediaMuxer::INITIALIZED) inputError(outPath + ": output format not supported");
 
     QNMediaExtractorWrapper& w = in.wrapper();
+    // The presentation starts at --start, or at the sync sample with --keyframe.
+    const int64_t originUs = trimOrigin(w, plan.tracks, startUs, args.has("--keyframe"));
     std::map<size_t, TrackState> states;
     for (size_t source : plan.tracks) {
         sp<AMessage> format = in.trackFormat(source)->dup();
@@ -192,6 +197,8 @@ int runTrim(const std::vector<std::string>& words) {
             t.frameBytes = channels * ((bits + 7) / 8);
             if (t.frameBytes <= 0) t.pcm = false;
         }
+        t.prerollUs = trimPrerollUs(format, plan.format);
+        setTrimDuration(format, originUs, endUs);
         const ssize_t index = muxer->addTrack(format);
         if (index < 0) inputError(outPath + ": the writer refused track " + std::to_string(source) + " (" + mime + ")");
         t.muxIndex = static_cast<size_t>(index);
@@ -207,15 +214,9 @@ int runTrim(const std::vector<std::string>& words) {
     }
     if (muxer->start() != OK) inputError(outPath + ": cannot start writing");
 
-    for (size_t source : plan.tracks) w.selectTrack(source);
-    if (w.seekTo(startUs, MediaTrack::ReadOptions::SEEK_PREVIOUS_SYNC) != OK) inputError(inPath + ": nothing to read at --start");
-
-    // The presentation starts at --start, or at the sync sample with --keyframe.
-    int64_t originUs = startUs;
-    if (args.has("--keyframe")) {
-        int64_t first;
-        if (w.getSampleTime(&first) == OK) originUs = std::min(first, startUs);
-    }
+    std::vector<TrimTrack> reading;
+    for (size_t source : plan.tracks) reading.push_back({source, states[source].prerollUs, &states[source].window});
+    if (!seekTrimStart(w, reading, originUs, endUs)) inputError(inPath + ": nothing to read at --start");
     for (auto& entry : states) {
         TrackState& t = entry.second;
         if (!t.flac) continue;
@@ -233,7 +234,12 @@ int runTrim(const std::vector<std::string>& words) {
         w.getSampleTime(&timeUs);
         w.getSampleMeta(&meta);
         TrackState& t = states[source];
-        if (endUs >= 0 && timeUs >= endUs) {
+        const TrimWindow::Step step = t.window.step(timeUs, meta);
+        if (step == TrimWindow::Step::kSkip) {
+            if (w.advance() != OK) break;
+            continue;
+        }
+        if (step == TrimWindow::Step::kClose) {
             w.unselectTrack(source);
             open.erase(source);
             continue;
@@ -254,8 +260,10 @@ int runTrim(const std::vector<std::string>& words) {
             buffer = converted;
         }
         if (keep) {
-            const status_t werr = muxer->writeSampleData(t.video ? 1 : 0, buffer, t.muxIndex, writeTimeUs - originUs, flags);
-            if (werr != OK) inputError(outPath + ": write failed (" + describeStatus(werr) + ")");
+            for (const TrimWindow::Sample& s : t.window.take({buffer, writeTimeUs, flags})) {
+                const status_t werr = muxer->writeSampleData(t.video ? 1 : 0, s.buffer, t.muxIndex, s.timeUs - originUs, s.flags);
+                if (werr != OK) inputError(outPath + ": write failed (" + describeStatus(werr) + ")");
+            }
         }
         progress.update(timeUs - startUs);
         if (w.advance() != OK) break;

@@ -114,7 +114,12 @@ def check_cut(src, work, start, end):
             "video: %d frames, wanted %d (first %s / %s)" % (len(got), len(want), got[:1], want[:1])
         video_src, video_out = want[0][0], got[0][0]
     for (si, kind, rate), (oi, _, _) in zip(src_streams, out_streams):
-        if kind != "audio" or video_src is None:
+        if kind != "audio":
+            continue
+        # Counted in samples, so the edit's media time is too.
+        tb = probe(out, "-select_streams", str(oi), "-show_entries", "stream=time_base", "-show_streams")
+        assert tb["streams"][0]["time_base"] == "1/%d" % rate, tb["streams"][0]["time_base"]
+        if video_src is None:
             continue
         src_first = decoded_frames(src, si)[0][0]
         want = max(start, src_first) - video_src

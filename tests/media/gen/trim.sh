@@ -90,11 +90,11 @@ node "$tmp/remux.mjs" "$tmp/mb_src.mp4" "$dir/mediabunny.mp4"
 cat >"$dir/cuts.txt" <<'EOF'
 ff_b2.mp4 0.5-2 1.03-2.47
 ff_b3_pyramid.mp4 0.52-2.01 1.1-
-ff_open_gop.mov 0.55-2.3 1.21-2.89
+ff_open_gop.mov 0.55-2.3
 ff_empty_edit.mp4 0.2-1.9 0.61-2.35
 ff_ss_copy.mp4 shifted 0.31-1.71
 ff_two_audio_sub.mov 0.7-2.2
-gst_qtmux.mov 0.5-2 1.03-2.47
+gst_qtmux.mov 1.03-2.47
 gst_mp4mux.mp4 0.9-2.6
 gst_3gppmux.3gp 0.41-1.99
 mediabunny.mp4 1.03-2.47

@@ -36,7 +36,12 @@ void catchInterrupts() {
     sigemptyset(&action.sa_mask);
     // Restarted calls: a signal must not surface as a spurious read or write error.
     action.sa_flags = SA_RESTART;
-    for (int sig : {SIGINT, SIGTERM, SIGHUP}) sigaction(sig, &action, nullptr);
+    for (int sig : {SIGINT, SIGTERM, SIGHUP}) {
+        // A signal ignored by whoever started us (nohup, a background job) stays ignored.
+        struct sigaction old;
+        if (sigaction(sig, nullptr, &old) == 0 && old.sa_handler == SIG_IGN) continue;
+        sigaction(sig, &action, nullptr);
+    }
 }
 
 bool interrupted() { return gSignal.load() != 0; }

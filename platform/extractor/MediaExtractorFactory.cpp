@@ -1,9 +1,12 @@
 #define LOG_TAG "MediaExtractorFactory"
 #include <media/stagefright/MediaExtractorFactory.h>
 
+#include <media/stagefright/ExtractorRefusal.h>
+
 #include <log/log.h>
 
 #include "extractor/Sniffers.h"
+#include "extractor/UnsupportedFormats.h"
 
 namespace android {
 
@@ -18,6 +21,7 @@ const ExtractorDef kExtractors[] = {
 }  // namespace
 
 sp<IMediaExtractor> MediaExtractorFactory::Create(const sp<DataSource>& source, const char* /*mime*/) {
+    clearRefusalReason();
     if (source == nullptr || source->initCheck() != OK) return nullptr;
     const ExtractorDef* best = nullptr;
     float bestConfidence = 0.0f;
@@ -29,12 +33,18 @@ sp<IMediaExtractor> MediaExtractorFactory::Create(const sp<DataSource>& source, 
         }
     }
     if (best == nullptr) {
-        ALOGW("no extractor recognises the data");
+        const char* format = NameUnsupportedFormat(source);
+        if (format != nullptr && peekRefusalReason().empty()) setRefusalReason("%s is not supported", format);
+        ALOGW("no extractor recognises the data%s%s", format ? ": " : "", format ? format : "");
         return nullptr;
     }
     ALOGV("sniffed %s (confidence %.2f)", best->name, bestConfidence);
     sp<IMediaExtractor> extractor = best->create(source);
-    if (extractor == nullptr) ALOGW("%s extractor could not parse the data", best->name);
+    if (extractor == nullptr) {
+        ALOGW("%s extractor could not parse the data", best->name);
+    } else {
+        clearRefusalReason();
+    }
     return extractor;
 }
 

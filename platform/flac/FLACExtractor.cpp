@@ -7,7 +7,9 @@
 #include <media/stagefright/MediaDefs.h>
 
 #include "extractor/DeviceKeys.h"
+#include "extractor/ID3v2Tag.h"
 #include "extractor/Sniffers.h"
+#include "extractor/SubDataSource.h"
 #include "flac/FLACDecoder.h"
 #include "flac/FLACFrameScanner.h"
 #include "flac/FLACPcmSource.h"
@@ -82,12 +84,16 @@ FLACExtractor::FLACExtractor(const sp<DataSource>& source, const FLACMetadata& m
 
 sp<IMediaSource> FLACExtractor::createTrack() {
     if (rawOutput()) return new FLACRawSource(mSource, mMeta, mRawMeta);
-    return new FLACPcmSource(mSource, mMeta.streamInfo, mTrackMeta);
+    // libFLAC skips a plain ID3v2 tag but not every form (a footer); it is
+    // given the stream from "fLaC" on.
+    const sp<DataSource> stream =
+        mMeta.streamOffset > 0 ? sp<DataSource>(new SubDataSource(mSource, mMeta.streamOffset)) : mSource;
+    return new FLACPcmSource(stream, mMeta.streamInfo, mTrackMeta);
 }
 
 float SniffFLAC(const sp<DataSource>& source) {
     uint8_t head[5];
-    if (!source->readExactly(0, head, sizeof(head))) return 0.0f;
+    if (!source->readExactly(SkipID3v2Tags(source, 0), head, sizeof(head))) return 0.0f;
     // "fLaC" followed by a STREAMINFO block header.
     return memcmp(head, "fLaC", 4) == 0 && (head[4] & 0x7F) == 0 ? 0.8f : 0.0f;
 }

@@ -7,6 +7,8 @@
 #include <log/log.h>
 #include <media/stagefright/MediaErrors.h>
 
+#include "extractor/ID3v2Tag.h"
+
 namespace android {
 
 namespace {
@@ -30,11 +32,13 @@ status_t ParseStreamInfo(const uint8_t* block, FLACMetadata* meta) {
 
 status_t ParseFLACMetadata(const sp<DataSource>& source, FLACMetadata* meta) {
     uint8_t magic[4];
-    if (!source->readExactly(0, magic, 4) || memcmp(magic, "fLaC", 4) != 0) return ERROR_MALFORMED;
+    const off64_t start = SkipID3v2Tags(source, 0);
+    if (!source->readExactly(start, magic, 4) || memcmp(magic, "fLaC", 4) != 0) return ERROR_MALFORMED;
     off64_t fileSize;
     if (source->getSize(&fileSize) != OK || fileSize < 0) fileSize = INT64_MAX;
 
-    off64_t offset = 4;
+    meta->streamOffset = start;
+    off64_t offset = start + 4;
     bool last = false;
     for (int n = 0; !last; ++n) {
         uint8_t header[4];

@@ -16,11 +16,13 @@ struct FLACMetadata {
     uint8_t streamInfoBlock[kStreamInfoBlockSize] = {};
     FlacStreamInfo streamInfo;
     DeviceItems items;
+    off64_t streamOffset = 0;  // where "fLaC" is: after any ID3v2 tags
     off64_t firstFrameOffset = 0;
 };
 
-// Reads "fLaC" and the metadata blocks up to the first frame. ERROR_MALFORMED
-// for a stream that is not FLAC or whose STREAMINFO is unusable.
+// Reads "fLaC" (after any ID3v2 tags) and the metadata blocks up to the
+// first frame. ERROR_MALFORMED for a stream that is not FLAC or whose
+// STREAMINFO is unusable.
 status_t ParseFLACMetadata(const sp<DataSource>& source, FLACMetadata* meta);
 
 }  // namespace android

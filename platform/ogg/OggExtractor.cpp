@@ -5,6 +5,7 @@
 #include <new>
 
 #include <log/log.h>
+#include <media/stagefright/ExtractorRefusal.h>
 #include <media/stagefright/MediaDefs.h>
 
 #include "extractor/SeekPolicy.h"
@@ -17,11 +18,14 @@ namespace android {
 sp<OggExtractor> OggExtractor::Create(const sp<DataSource>& source) {
     std::shared_ptr<VorbisHeaders> headers(new (std::nothrow) VorbisHeaders);
     if (headers == nullptr || headers->read(source) != OK) return nullptr;
-    return new OggExtractor(source, headers);
+    std::shared_ptr<const OggChain> chain = OggChain::Scan(source, *headers);
+    if (chain == nullptr) return nullptr;
+    return new OggExtractor(source, headers, chain);
 }
 
-OggExtractor::OggExtractor(const sp<DataSource>& source, const std::shared_ptr<const VorbisHeaders>& headers)
-    : SingleTrackExtractor(MEDIA_MIMETYPE_CONTAINER_OGG), mSource(source), mHeaders(headers) {
+OggExtractor::OggExtractor(const sp<DataSource>& source, const std::shared_ptr<const VorbisHeaders>& headers,
+                           const std::shared_ptr<const OggChain>& chain)
+    : SingleTrackExtractor(MEDIA_MIMETYPE_CONTAINER_OGG), mSource(source), mHeaders(headers), mChain(chain) {
     MetaData* t = mTrackMeta.get();
     t->setCString(kKeyMIMEType, MEDIA_MIMETYPE_AUDIO_VORBIS);
     t->setInt32(kKeySampleRate, static_cast<int32_t>(headers->sampleRate()));
@@ -29,7 +33,7 @@ OggExtractor::OggExtractor(const sp<DataSource>& source, const std::shared_ptr<c
     t->setData(kKeyVorbisInfo, 0, headers->identification().data(), headers->identification().size());
     t->setData(kKeyVorbisBooks, 0, headers->setup().data(), headers->setup().size());
     t->setInt32(kKeyMaxInputSize, static_cast<int32_t>(OggVorbisStream::kMaxPacketBytes));
-    const int64_t last = OggVorbisStream::LastGranule(source, headers->serial(), headers->audioStart());
+    const int64_t last = chain->totalSamples();
     int64_t durationUs = 0;
     if (last > 0) {
         durationUs = TicksToUs(static_cast<uint64_t>(last), headers->sampleRate());
@@ -44,7 +48,7 @@ OggExtractor::OggExtractor(const sp<DataSource>& source, const std::shared_ptr<c
     }
 }
 
-sp<IMediaSource> OggExtractor::createTrack() { return new OggSource(mSource, mHeaders, mTrackMeta); }
+sp<IMediaSource> OggExtractor::createTrack() { return new OggSource(mSource, mHeaders, mChain, mTrackMeta); }
 
 float SniffOgg(const sp<DataSource>& source) {
     // The first page, and the Vorbis identification header at the start of
@@ -54,7 +58,22 @@ float SniffOgg(const sp<DataSource>& source) {
     if (n < 27 || memcmp(head, "OggS", 4) != 0) return 0.0f;
     const size_t body = 27 + head[26];
     if (static_cast<size_t>(n) < body + 7) return 0.0f;
-    return memcmp(head + body, "\x01vorbis", 7) == 0 ? 0.8f : 0.0f;
+    if (memcmp(head + body, "\x01vorbis", 7) == 0) return 0.8f;
+    // Other codecs' first packets start with their own magic.
+    static const struct {
+        const char* magic;
+        size_t length;
+        const char* name;
+    } kOthers[] = {{"\x7f" "FLAC", 5, "FLAC"},   {"OpusHead", 8, "Opus"}, {"Speex   ", 8, "Speex"},
+                   {"\x80theora", 7, "Theora video"}, {"fishead", 7, "a Skeleton index first"}};
+    const char* name = "an unknown codec";
+    for (const auto& other : kOthers) {
+        if (static_cast<size_t>(n) >= body + other.length && memcmp(head + body, other.magic, other.length) == 0) {
+            name = other.name;
+        }
+    }
+    setRefusalReason("Ogg stream holds %s, which is not supported", name);
+    return 0.0f;
 }
 
 sp<IMediaExtractor> CreateOggExtractor(const sp<DataSource>& source) {

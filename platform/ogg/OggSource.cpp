@@ -9,11 +9,11 @@
 namespace android {
 
 OggSource::OggSource(const sp<DataSource>& source, const std::shared_ptr<const VorbisHeaders>& headers,
-                     const sp<MetaData>& format)
-    : TrackSource(format), mSource(source), mHeaders(headers) {}
+                     const std::shared_ptr<const OggChain>& chain, const sp<MetaData>& format)
+    : TrackSource(format), mSource(source), mHeaders(headers), mChain(chain) {}
 
 status_t OggSource::onStart() {
-    mStream.reset(new (std::nothrow) OggVorbisStream(mSource, mHeaders));
+    mStream.reset(new (std::nothrow) OggVorbisStream(mSource, mHeaders, mChain));
     return mStream != nullptr ? OK : NO_MEMORY;
 }
 

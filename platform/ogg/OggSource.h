@@ -13,7 +13,7 @@ namespace android {
 class OggSource : public TrackSource {
 public:
     OggSource(const sp<DataSource>& source, const std::shared_ptr<const VorbisHeaders>& headers,
-              const sp<MetaData>& format);
+              const std::shared_ptr<const OggChain>& chain, const sp<MetaData>& format);
 
 protected:
     status_t onStart() override;
@@ -24,6 +24,7 @@ protected:
 private:
     const sp<DataSource> mSource;
     const std::shared_ptr<const VorbisHeaders> mHeaders;
+    const std::shared_ptr<const OggChain> mChain;
     std::unique_ptr<OggVorbisStream> mStream;
 };
 

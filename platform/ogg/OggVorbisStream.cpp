@@ -17,27 +17,58 @@ constexpr off64_t kLinearSpan = 64 * 1024;
 constexpr off64_t kProbeSpan = 256 * 1024;
 }  // namespace
 
-OggVorbisStream::OggVorbisStream(const sp<DataSource>& source, const std::shared_ptr<const VorbisHeaders>& headers)
-    : mHeaders(headers), mReader(source), mPreviousBlock(0), mFresh(true), mLastEnd(-1), mEnded(false) {
-    ogg_stream_init(&mStream, mHeaders->serial());
-    restart(mHeaders->audioStart(), true);
+OggVorbisStream::OggVorbisStream(const sp<DataSource>& source, const std::shared_ptr<const VorbisHeaders>& headers,
+                                 const std::shared_ptr<const OggChain>& chain)
+    : mHeaders(headers),
+      mChain(chain),
+      mLink(0),
+      mReader(source),
+      mPreviousBlock(0),
+      mFresh(true),
+      mLastEnd(-1),
+      mEnded(false),
+      mEndStatus(ERROR_END_OF_STREAM) {
+    ogg_stream_init(&mStream, link().serial);
+    restart(0, link().audioStart, true);
 }
 
 OggVorbisStream::~OggVorbisStream() { ogg_stream_clear(&mStream); }
 
-void OggVorbisStream::restart(off64_t offset, bool atStreamStart) {
+void OggVorbisStream::restart(size_t index, off64_t offset, bool atLinkStart) {
+    mLink = index;
     mReader.seek(offset);
-    ogg_stream_reset(&mStream);
+    ogg_stream_reset_serialno(&mStream, link().serial);
     mReady.clear();
     mPreviousBlock = 0;
-    mFresh = atStreamStart;
-    mLastEnd = atStreamStart ? 0 : -1;
+    mFresh = atLinkStart;
+    mLastEnd = atLinkStart ? 0 : -1;
     mEnded = false;
+    mEndStatus = ERROR_END_OF_STREAM;
+}
+
+bool OggVorbisStream::nextLink() {
+    if (mLink + 1 >= mChain->links().size()) {
+        mEnded = true;
+        mEndStatus = mChain->endStatus();
+        if (mEndStatus != ERROR_END_OF_STREAM) {
+            ALOGE("the Ogg stream goes on with a link this track cannot carry");
+        }
+        return false;
+    }
+    // Packets already taken keep their times; the queue is not cleared.
+    const size_t next = mLink + 1;
+    mLink = next;
+    mReader.seek(link().audioStart);
+    ogg_stream_reset_serialno(&mStream, link().serial);
+    mPreviousBlock = 0;
+    mFresh = true;
+    mLastEnd = 0;
+    return true;
 }
 
 status_t OggVorbisStream::peek(const VorbisPacket** packet) {
     while (mReady.empty()) {
-        if (mEnded) return ERROR_END_OF_STREAM;
+        if (mEnded) return mEndStatus;
         const status_t err = readPage();
         if (err != OK) return err;
     }
@@ -104,7 +135,8 @@ void OggVorbisStream::stamp(std::vector<Pending>* packets, int64_t granule, bool
         // final granule position are not kept.
         const int64_t keepEnd = lastPage && granule >= 0 ? std::min(out.end, granule) : out.end;
         out.valid = static_cast<int32_t>(std::clamp<int64_t>(keepEnd - std::max<int64_t>(out.start, 0), 0, p.samples));
-        out.start = std::max<int64_t>(out.start, 0);
+        out.start = std::max<int64_t>(out.start, 0) + link().base;
+        out.end += link().base;
         out.data = std::move(p.data);
         mReady.push_back(std::move(out));
     }
@@ -120,12 +152,12 @@ status_t OggVorbisStream::readPage() {
         ogg_page page;
         off64_t offset;
         const status_t err = mReader.nextPage(&page, &offset);
-        if (err == ERROR_END_OF_STREAM) {
-            mEnded = true;
+        if (err == ERROR_END_OF_STREAM || (err == OK && offset >= link().end)) {
+            nextLink();
             return OK;
         }
         if (err != OK) return err;
-        if (ogg_page_serialno(&page) != mHeaders->serial()) continue;
+        if (ogg_page_serialno(&page) != link().serial) continue;
         if (ogg_stream_pagein(&mStream, &page) != 0) continue;
         if (mStream.body_fill - mStream.body_returned > kMaxBodyBytes) {
             ALOGW("packet spans more than %ld bytes", kMaxBodyBytes);
@@ -134,7 +166,7 @@ status_t OggVorbisStream::readPage() {
         std::vector<Pending> packets;
         takePackets(&packets);
         stamp(&packets, ogg_page_granulepos(&page), ogg_page_eos(&page) != 0);
-        if (ogg_page_eos(&page)) mEnded = true;
+        if (ogg_page_eos(&page)) nextLink();
         return OK;
     }
 }
@@ -145,13 +177,13 @@ bool OggVorbisStream::findPageBefore(int64_t target, off64_t* found) {
         mReader.seek(from);
         ogg_page page;
         while (mReader.nextPage(&page, offset) == OK && *offset - from < kProbeSpan) {
-            if (ogg_page_serialno(&page) != mHeaders->serial()) continue;
+            if (ogg_page_serialno(&page) != link().serial) continue;
             *granule = ogg_page_granulepos(&page);
             if (*granule >= 0) return true;
         }
         return false;
     };
-    off64_t low = mHeaders->audioStart(), high = mReader.size();
+    off64_t low = link().audioStart, high = link().end;
     bool have = false;
     while (high - low > kLinearSpan) {
         const off64_t mid = low + (high - low) / 2;
@@ -168,8 +200,8 @@ bool OggVorbisStream::findPageBefore(int64_t target, off64_t* found) {
     mReader.seek(low);
     ogg_page page;
     off64_t offset;
-    while (mReader.nextPage(&page, &offset) == OK) {
-        if (ogg_page_serialno(&page) != mHeaders->serial()) continue;
+    while (mReader.nextPage(&page, &offset) == OK && offset < link().end) {
+        if (ogg_page_serialno(&page) != link().serial) continue;
         const int64_t granule = ogg_page_granulepos(&page);
         if (granule > target) break;
         if (granule >= 0) {
@@ -184,17 +216,18 @@ bool OggVorbisStream::findPageBefore(int64_t target, off64_t* found) {
 status_t OggVorbisStream::seek(int64_t timeUs, SeekMode mode) {
     const int64_t target = static_cast<int64_t>(
         SeekUnitIndex(timeUs, mHeaders->sampleRate(), 1, MediaTrack::ReadOptions::SEEK_PREVIOUS_SYNC));
-    if (target == 0) {
-        restart(mHeaders->audioStart(), true);
-        return OK;
-    }
+    const size_t index = mChain->linkAt(target);
+    const OggLink& at = mChain->links()[index];
+    mLink = index;  // the link findPageBefore searches
     off64_t page;
     // Packets that complete on the page found end at or before the target,
     // and they give the block size that the next packet's count needs.
-    if (findPageBefore(target, &page)) {
-        restart(page, false);
+    if (target > at.base && findPageBefore(target - at.base, &page)) {
+        restart(index, page, false);
     } else {
-        restart(mHeaders->audioStart(), true);
+        restart(index, at.audioStart, true);
+        // From the link's start: its priming packet comes first.
+        if (target == at.base) return OK;
     }
     const uint32_t rate = mHeaders->sampleRate();
     for (;;) {
@@ -209,26 +242,6 @@ status_t OggVorbisStream::seek(int64_t timeUs, SeekMode mode) {
         // The packet holds the target: it, or the one that starts at its end.
         if (SeekPrefersLater(timeUs, TicksToUs(packet->start, rate), TicksToUs(packet->end, rate), mode)) pop();
         return OK;
-    }
-}
-
-int64_t OggVorbisStream::LastGranule(const sp<DataSource>& source, int serial, off64_t audioStart) {
-    OggPageReader reader(source);
-    const off64_t size = reader.size();
-    if (size == INT64_MAX) return -1;
-    // Look at growing tails of the file until one holds a timed page.
-    for (off64_t span = 64 * 1024;; span *= 4) {
-        const off64_t from = std::max(audioStart, size - span);
-        reader.seek(from);
-        int64_t last = -1;
-        ogg_page page;
-        off64_t offset;
-        while (reader.nextPage(&page, &offset) == OK) {
-            if (ogg_page_serialno(&page) == serial && ogg_page_granulepos(&page) >= 0) {
-                last = ogg_page_granulepos(&page);
-            }
-        }
-        if (last >= 0 || from == audioStart) return last;
     }
 }
 

@@ -1,6 +1,8 @@
 #define LOG_TAG "OggExtractor"
 #include "ogg/VorbisHeaders.h"
 
+#include <algorithm>
+
 #include <log/log.h>
 #include <media/stagefright/MediaErrors.h>
 
@@ -41,8 +43,20 @@ status_t VorbisHeaders::add(ogg_packet* packet) {
     return OK;
 }
 
-status_t VorbisHeaders::read(const sp<DataSource>& source) {
+bool VorbisHeaders::decodesLike(const VorbisHeaders& other) const {
+    // Identification header (Vorbis I, 4.2.2): the bitrate fields at 16..27
+    // only describe the stream; rate, channels and block sizes matter.
+    auto same = [&](size_t from, size_t to) {
+        return mIdentification.size() >= to && other.mIdentification.size() >= to &&
+               std::equal(mIdentification.begin() + from, mIdentification.begin() + to,
+                          other.mIdentification.begin() + from);
+    };
+    return same(0, 16) && same(28, 30) && mSetup == other.mSetup;
+}
+
+status_t VorbisHeaders::read(const sp<DataSource>& source, off64_t start) {
     OggPageReader reader(source);
+    reader.seek(start);
     ogg_stream_state stream;
     bool haveStream = false;
     status_t err = OK;
@@ -53,7 +67,7 @@ status_t VorbisHeaders::read(const sp<DataSource>& source) {
         if (err != OK) break;
         if (!haveStream) {
             // The first page opens the stream whose headers come first.
-            if (offset != 0 || !ogg_page_bos(&page)) {
+            if (offset != start || !ogg_page_bos(&page)) {
                 err = ERROR_MALFORMED;
                 break;
             }

@@ -19,9 +19,13 @@ public:
     VorbisHeaders();
     ~VorbisHeaders();
 
-    // Reads the headers from the first logical stream of an Ogg file.
-    // ERROR_MALFORMED when it does not start with a Vorbis stream.
-    status_t read(const sp<DataSource>& source);
+    // Reads the headers from the first logical stream of the Ogg link that
+    // starts at `start` (0: the file). ERROR_MALFORMED when it does not
+    // start with a Vorbis stream.
+    status_t read(const sp<DataSource>& source, off64_t start = 0);
+    // Whether packets of a stream with these headers decode as those of
+    // `other` would: the same rate, channels, block sizes and set-up.
+    bool decodesLike(const VorbisHeaders& other) const;
 
     int serial() const { return mSerial; }
     // Offset of the first page after the headers: audio starts on a fresh page.

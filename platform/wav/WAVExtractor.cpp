@@ -36,8 +36,8 @@ WAVExtractor::WAVExtractor(const sp<DataSource>& source, const WAVInfo& info)
     t->setInt32(kKeyBitsPerSample, info.bitsPerSample);
     t->setInt32(kKeyDeviceBitsPerSample, info.bitsPerSample);
     t->setInt32(kKeyPcmEncoding, WAVPcmEncoding(info));
-    t->setInt32(kKeyMaxInputSize,
-                static_cast<int32_t>(WAVSource::FramesPerSample(info.frameSize) * info.frameSize));
+    const uint32_t outFrame = info.outputFrameSize();
+    t->setInt32(kKeyMaxInputSize, static_cast<int32_t>(WAVSource::FramesPerSample(outFrame) * outFrame));
     info.items.publishTrackItems(t);
 }
 
@@ -46,7 +46,8 @@ sp<IMediaSource> WAVExtractor::createTrack() { return new WAVSource(mSource, mIn
 float SniffWAV(const sp<DataSource>& source) {
     uint8_t head[12];
     if (!source->readExactly(0, head, sizeof(head))) return 0.0f;
-    return memcmp(head, "RIFF", 4) == 0 && memcmp(head + 8, "WAVE", 4) == 0 ? 0.8f : 0.0f;
+    const bool riff = memcmp(head, "RIFF", 4) == 0 || memcmp(head, "RF64", 4) == 0 || memcmp(head, "BW64", 4) == 0;
+    return riff && memcmp(head + 8, "WAVE", 4) == 0 ? 0.8f : 0.0f;
 }
 
 sp<IMediaExtractor> CreateWAVExtractor(const sp<DataSource>& source) {

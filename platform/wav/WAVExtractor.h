@@ -9,7 +9,8 @@
 
 namespace android {
 
-// RIFF/WAVE with one PCM track.
+// RIFF/WAVE (and RF64/BW64) with one PCM track; A-law and mu-law are
+// expanded to 16-bit PCM.
 class WAVExtractor : public SingleTrackExtractor {
 public:
     // Null when the file cannot be used.

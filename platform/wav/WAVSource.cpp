@@ -6,6 +6,8 @@
 #include <log/log.h>
 #include <media/stagefright/MediaErrors.h>
 
+#include "wav/G711.h"
+
 namespace android {
 
 namespace {
@@ -22,8 +24,10 @@ WAVSource::WAVSource(const sp<DataSource>& source, const WAVInfo& info, const sp
       mDataOffset(info.dataOffset),
       mFrameCount(info.frameCount),
       mFrameSize(info.frameSize),
+      mOutputFrameSize(info.outputFrameSize()),
+      mG711(info.isG711() ? info.encoding : 0),
       mSampleRate(info.sampleRate),
-      mFramesPerSample(FramesPerSample(info.frameSize)),
+      mFramesPerSample(FramesPerSample(info.outputFrameSize())),
       mNextFrame(0) {}
 
 status_t WAVSource::seekTo(int64_t timeUs, SeekMode mode) {
@@ -36,20 +40,27 @@ status_t WAVSource::readNext(MediaBufferBase** out) {
     if (mNextFrame >= mFrameCount) return ERROR_END_OF_STREAM;
     const uint64_t frames = std::min<uint64_t>(mFramesPerSample, mFrameCount - mNextFrame);
     const size_t bytes = static_cast<size_t>(frames * mFrameSize);
-    MediaBuffer* buffer = NewSampleBuffer(bytes, TicksToUs(mNextFrame, mSampleRate));
+    const size_t outBytes = static_cast<size_t>(frames * mOutputFrameSize);
+    MediaBuffer* buffer = NewSampleBuffer(outBytes, TicksToUs(mNextFrame, mSampleRate));
     if (buffer == nullptr) return NO_MEMORY;
     *out = buffer;
-    const ssize_t got = mSource->readAt(mDataOffset + static_cast<off64_t>(mNextFrame * mFrameSize),
-                                        buffer->data(), bytes);
+    // Codes to expand go to the end of the buffer, and the samples fill it
+    // from the start.
+    uint8_t* const data = static_cast<uint8_t*>(buffer->data());
+    uint8_t* const stored = data + (outBytes - bytes);
+    const ssize_t got = mSource->readAt(mDataOffset + static_cast<off64_t>(mNextFrame * mFrameSize), stored, bytes);
     if (got < 0) {
         ALOGW("read failed (%zd)", got);
         return ERROR_IO;
     }
     // The file may have shrunk since it was opened: hand out whole frames only.
-    const size_t whole = static_cast<size_t>(got) / mFrameSize * mFrameSize;
-    if (whole == 0) return ERROR_END_OF_STREAM;
-    buffer->set_range(0, whole);
-    mNextFrame += whole / mFrameSize;
+    const size_t wholeFrames = static_cast<size_t>(got) / mFrameSize;
+    if (wholeFrames == 0) return ERROR_END_OF_STREAM;
+    if (mG711 != 0) {
+        ExpandG711(mG711 == kWAVFormatALaw, stored, reinterpret_cast<int16_t*>(data), wholeFrames * mFrameSize);
+    }
+    buffer->set_range(0, wholeFrames * mOutputFrameSize);
+    mNextFrame += wholeFrames;
     return OK;
 }
 

@@ -8,7 +8,8 @@
 
 namespace android {
 
-// Reads the data chunk in samples of whole frames (about 4 KiB each).
+// Reads the data chunk in samples of whole frames (about 4 KiB each as
+// handed out).
 class WAVSource : public TrackSource {
 public:
     WAVSource(const sp<DataSource>& source, const WAVInfo& info, const sp<MetaData>& format);
@@ -24,7 +25,9 @@ private:
     const sp<DataSource> mSource;
     const off64_t mDataOffset;
     const uint64_t mFrameCount;
-    const uint32_t mFrameSize;
+    const uint32_t mFrameSize;  // as stored
+    const uint32_t mOutputFrameSize;
+    const int mG711;  // 0, or the format tag of the codes to expand
     const uint32_t mSampleRate;
     const uint32_t mFramesPerSample;
     uint64_t mNextFrame;

@@ -21,8 +21,9 @@ namespace audiotest {
 
 using namespace android;
 
+// "name" is a file of audio/; "dir/name" one of another media directory.
 inline std::string MediaPath(const std::string& name) {
-    return std::string(ME_TEST_MEDIA_DIR) + "/audio/" + name;
+    return std::string(ME_TEST_MEDIA_DIR) + (name.find('/') == std::string::npos ? "/audio/" : "/") + name;
 }
 
 inline std::vector<uint8_t> ReadFile(const std::string& name) {
@@ -36,16 +37,18 @@ inline sp<DataSource> MemorySource(const std::vector<uint8_t>& bytes) {
     return new BufferDataSource(bytes.data(), bytes.size());
 }
 
-// "<file> <key> <value>" lines.
+// "<file> <key> <value>" lines of the facts.txt beside the file.
 inline std::string Fact(const std::string& file, const std::string& key) {
-    std::ifstream in(MediaPath("facts.txt"));
+    const size_t slash = file.rfind('/');
+    const std::string dir = slash == std::string::npos ? "" : file.substr(0, slash + 1);
+    std::ifstream in(MediaPath(dir + "facts.txt"));
     std::string line;
     while (std::getline(in, line)) {
         std::istringstream fields(line);
         std::string f, k, v;
         fields >> f >> k;
         std::getline(fields >> std::ws, v);
-        if (f == file && k == key) return v;
+        if (dir + f == file && k == key) return v;
     }
     return "";
 }

@@ -5,7 +5,10 @@
 // writer pulls from (the muxer's adapter), and the command-line checkers.
 
 #include <fcntl.h>
+#include <sys/resource.h>
 #include <unistd.h>
+
+#include <csignal>
 
 #include <cstdint>
 #include <cstdio>
@@ -50,6 +53,29 @@ public:
 
 private:
     std::string mPath;
+};
+
+// While it lives, writes that would take a file past `bytes` fail with EFBIG
+// instead of raising the signal, as on a file system that has run out.
+class FileSizeCap {
+public:
+    explicit FileSizeCap(rlim_t bytes) {
+        mPrevious = signal(SIGXFSZ, SIG_IGN);
+        mSet = getrlimit(RLIMIT_FSIZE, &mSaved) == 0;
+        struct rlimit small = mSaved;
+        small.rlim_cur = bytes;
+        mSet = mSet && setrlimit(RLIMIT_FSIZE, &small) == 0;
+    }
+    ~FileSizeCap() {
+        if (mSet) setrlimit(RLIMIT_FSIZE, &mSaved);
+        signal(SIGXFSZ, mPrevious);
+    }
+    bool active() const { return mSet; }
+
+private:
+    struct rlimit mSaved;
+    void (*mPrevious)(int);
+    bool mSet;
 };
 
 inline android::sp<android::MediaAdapter> makeSource(const android::sp<android::MetaData>& format) {

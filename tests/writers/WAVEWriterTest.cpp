@@ -1,9 +1,7 @@
 #include <gtest/gtest.h>
 
 #include <cerrno>
-#include <csignal>
 #include <cmath>
-#include <sys/resource.h>
 #include <map>
 
 #include <media/stagefright/MediaDefs.h>
@@ -292,29 +290,22 @@ TEST(WAVEWriterTest, DataIsCappedSoTheRiffSizeFits) {
 }
 
 TEST(WAVEWriterTest, AWriteFailureMidStreamIsReportedAndNeverBlocksTheProducer) {
-    // The file may not grow past 64 KiB: writes beyond fail instead of
-    // raising the signal.
-    struct rlimit saved;
-    ASSERT_EQ(0, getrlimit(RLIMIT_FSIZE, &saved));
-    struct rlimit small = saved;
-    small.rlim_cur = 64 * 1024;
-    void (*previous)(int) = signal(SIGXFSZ, SIG_IGN);
-    ASSERT_EQ(0, setrlimit(RLIMIT_FSIZE, &small));
-
     ScratchFile file(".wav");
-    sp<QNWAVEWriter> writer = new QNWAVEWriter(file.fd);
-    sp<MediaAdapter> source = makeSource(pcmFormat(2, 44100, kAudioEncodingPcm16bit));
-    ASSERT_EQ(OK, writer->addSource(source));
-    ASSERT_EQ(OK, writer->start());
-    LogCapture logs;
-    // Far more buffers than the adapter queues: the writer keeps taking them.
-    for (int i = 0; i < 300; ++i) push(source, Bytes(4096, uint8_t(i)));
-    const status_t err = writer->stop();
-
-    setrlimit(RLIMIT_FSIZE, &saved);
-    signal(SIGXFSZ, previous);
+    status_t err;
+    {
+        FileSizeCap cap(64 * 1024);
+        ASSERT_TRUE(cap.active());
+        sp<QNWAVEWriter> writer = new QNWAVEWriter(file.fd);
+        sp<MediaAdapter> source = makeSource(pcmFormat(2, 44100, kAudioEncodingPcm16bit));
+        ASSERT_EQ(OK, writer->addSource(source));
+        ASSERT_EQ(OK, writer->start());
+        LogCapture logs;
+        // Far more buffers than the adapter queues: the writer keeps taking them.
+        for (int i = 0; i < 300; ++i) push(source, Bytes(4096, uint8_t(i)));
+        err = writer->stop();
+        EXPECT_TRUE(logs.containsAt(ANDROID_LOG_ERROR, "dropping the rest"));
+    }
     EXPECT_EQ(-EFBIG, err);
-    EXPECT_TRUE(logs.containsAt(ANDROID_LOG_ERROR, "dropping the rest"));
     // The header describes the samples that were written in full (a
     // partly written one may follow them).
     const Bytes f = file.bytes();

@@ -16,6 +16,8 @@
 #include "OutputFile.h"
 #include "Progress.h"
 #include "TrimWindow.h"
+#include "Interrupt.h"
+#include "ReadCoverage.h"
 #include "QNMediaFlacFrameConverter.h"
 #include "QNMediaMuxer.h"
 
@@ -26,7 +28,7 @@ namespace qnedit {
 
 const char* const kTrimHelp =
     "usage: qnedit trim IN OUT --start SEC [--end SEC] [--tracks LIST] [--format mp4|m4a|wav|flac|amr]\n"
-    "                  [--keyframe]\n"
+    "                  [--keyframe] [--salvage]\n"
     "\n"
     "Cuts IN losslessly into OUT. Reading starts at the sync sample at or before\n"
     "--start; in MP4 and M4A output the presentation still starts exactly at\n"
@@ -37,8 +39,12 @@ const char* const kTrimHelp =
     "  --tracks LIST  track indices to keep, e.g. 0,1 (default: all that fit the format)\n"
     "  --format F     output format; by default from OUT's extension\n"
     "  --keyframe     start at the sync sample itself instead of --start\n"
+    "  --salvage      keep what can be read of a damaged input (with a warning)\n"
+    "                 instead of failing\n"
     "FLAC is trimmed by whole frames, renumbered with a new stream header; 32-bit\n"
-    "integer or float WAV comes out as 24-bit.\n";
+    "integer or float WAV comes out as 24-bit.\n"
+    "OUT is written beside itself under a temporary name and replaces OUT only\n"
+    "when complete; OUT may not be IN. A symbolic link as OUT is followed.\n";
 
 namespace {
 
@@ -152,14 +158,14 @@ bool cutPcm(const TrackState& t, int64_t timeUs, int64_t startUs, int64_t endUs,
 }  // namespace
 
 int runTrim(const std::vector<std::string>& words) {
-    Args args(words, {"--start", "--end", "--tracks", "--format"}, {"--keyframe"});
+    Args args(words, {"--start", "--end", "--tracks", "--format"}, {"--keyframe", "--salvage"});
     args.expectPositional(2, "qnedit trim IN OUT --start SEC [--end SEC] [--tracks LIST] [--format F]");
     if (!args.has("--start")) usageError("--start is required");
     const std::string inPath = args.positional()[0], outPath = args.positional()[1];
-    const int64_t startUs = static_cast<int64_t>(std::llround(args.getDouble("--start", 0) * 1e6));
-    const int64_t endUs = args.has("--end") ? static_cast<int64_t>(std::llround(args.getDouble("--end", 0) * 1e6)) : -1;
-    if (startUs < 0) usageError("--start must not be negative");
+    const int64_t startUs = parseSeconds(args.get("--start"), "--start");
+    const int64_t endUs = args.has("--end") ? parseSeconds(args.get("--end"), "--end") : -1;
     if (endUs >= 0 && endUs <= startUs) usageError("--end must come after --start");
+    checkOutputPath(outPath, {inPath});
 
     const std::string wanted = args.get("--format", lowerExtension(outPath));
     Input in(inPath, wanted == "flac");
@@ -167,8 +173,13 @@ int runTrim(const std::vector<std::string>& words) {
     if (in.durationUs() >= 0 && startUs >= in.durationUs()) {
         inputError(inPath + ": --start lies past the end (" + std::to_string(in.durationUs() / 1e6) + " s)");
     }
+    // A little slack: durations in containers are rounded.
+    if (in.durationUs() >= 0 && endUs > in.durationUs() + 1000) {
+        inputError(inPath + ": --end lies past the end (" + std::to_string(in.durationUs() / 1e6) +
+                   " s); leave it out to keep everything to the end");
+    }
 
-    OutputFile out(outPath);
+    OutputFile out(outPath, {inPath});
     sp<QNMediaMuxer> muxer = new QNMediaMuxer(out.fd(), static_cast<OutputFileFormat>(plan.muxFormat));
     if (muxer->getMuxerState() != QNMediaMuxer::INITIALIZED) inputError(outPath + ": output format not supported");
 
@@ -216,7 +227,7 @@ int runTrim(const std::vector<std::string>& words) {
 
     std::vector<TrimTrack> reading;
     for (size_t source : plan.tracks) reading.push_back({source, states[source].prerollUs, &states[source].window});
-    if (!seekTrimStart(w, reading, originUs, endUs)) inputError(inPath + ": nothing to read at --start");
+    if (!seekTrimStart(w, reading, originUs, endUs)) inputError(inPath + ": nothing readable at --start (damaged?)");
     for (auto& entry : states) {
         TrackState& t = entry.second;
         if (!t.flac) continue;
@@ -227,13 +238,19 @@ int runTrim(const std::vector<std::string>& words) {
 
     Progress progress("trim", (endUs >= 0 ? endUs : in.durationUs()) - startUs);
     std::set<size_t> open(plan.tracks.begin(), plan.tracks.end());
+    ReadCoverage coverage;
+    const bool salvage = args.has("--salvage");
+    size_t written = 0;
     size_t source;
     while (!open.empty() && w.getSampleTrackIndex(&source) == OK) {
+        checkInterrupted();
         int64_t timeUs = 0;
         sp<MetaData> meta;
         w.getSampleTime(&timeUs);
         w.getSampleMeta(&meta);
         TrackState& t = states[source];
+        if (t.flac != nullptr) coverage.expectEvenSpacing(source);
+        coverage.saw(source, timeUs);
         const TrimWindow::Step step = t.window.step(timeUs, meta);
         if (step == TrimWindow::Step::kSkip) {
             if (w.advance() != OK) break;
@@ -246,7 +263,10 @@ int runTrim(const std::vector<std::string>& words) {
         }
         sp<ABuffer> buffer;
         const status_t err = w.readSampleData(&buffer);
-        if (err != OK) inputError(inPath + ": " + describeStatus(err));
+        if (err != OK) {
+            coverage.fail(timeUs, describeStatus(err));
+            break;
+        }
         uint32_t flags = 0;
         int32_t sync = 0;
         if (meta != nullptr && meta->findInt32(kKeyIsSyncFrame, &sync) && sync) flags |= 1;
@@ -256,19 +276,31 @@ int runTrim(const std::vector<std::string>& words) {
         if (t.flac != nullptr) {
             buffer->meta()->setInt64("timeUs", timeUs);
             sp<ABuffer> converted;
-            if (!t.flac->convert(buffer, &converted)) inputError(inPath + ": unreadable FLAC frame at " + std::to_string(timeUs / 1e6) + " s");
+            if (!t.flac->convert(buffer, &converted)) {
+                coverage.fail(timeUs, "unreadable FLAC frame");
+                break;
+            }
             buffer = converted;
         }
         if (keep) {
             for (const TrimWindow::Sample& s : t.window.take({buffer, writeTimeUs, flags})) {
                 const status_t werr = muxer->writeSampleData(t.video ? 1 : 0, s.buffer, t.muxIndex, s.timeUs - originUs, s.flags);
-                if (werr != OK) inputError(outPath + ": write failed (" + describeStatus(werr) + ")");
+                if (werr != OK) inputError(outPath + ": write failed (" + describeWriteStatus(werr) + ")");
+                ++written;
             }
         }
         progress.update(timeUs - startUs);
         if (w.advance() != OK) break;
     }
     progress.finish();
+    for (size_t track : plan.tracks) {
+        int64_t durationUs = -1;
+        in.trackFormat(track)->findInt64("durationUs", &durationUs);
+        const int64_t wantUs = endUs >= 0 && (durationUs < 0 || endUs < durationUs) ? endUs : durationUs;
+        if (wantUs > 0) coverage.expectReach(track, wantUs);
+    }
+    coverage.report(inPath, salvage);
+    if (written == 0) inputError(inPath + ": no samples in the range; nothing written");
     finishOutput(muxer, out);
     return kExitOk;
 }

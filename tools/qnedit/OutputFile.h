@@ -17,7 +17,7 @@ namespace qnedit {
 // points to is replaced and the link stays. An existing OUT keeps its mode.
 class OutputFile {
 public:
-    OutputFile(const std::string& path, const std::vector<std::string>& inputs = {});
+    OutputFile(const std::string& path, const std::vector<std::string>& inputs);
     ~OutputFile();
     OutputFile(const OutputFile&) = delete;
     OutputFile& operator=(const OutputFile&) = delete;

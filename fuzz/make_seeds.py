@@ -64,7 +64,10 @@ def flac_frames(path):
     """STREAMINFO header (42 bytes) and the frames, cut by the sizes in the
     .packets file beside it (third column)."""
     data = open(path, "rb").read()
-    pos = 4
+    start = 0
+    if data[:3] == b"ID3":  # a tag in front: syncsafe size, footer flag
+        start = 10 + ((data[6] << 21) | (data[7] << 14) | (data[8] << 7) | data[9]) + (10 if data[5] & 0x10 else 0)
+    pos = start + 4
     while True:
         last, length = data[pos] & 0x80, int.from_bytes(data[pos + 1:pos + 4], "big")
         pos += 4 + length
@@ -75,7 +78,7 @@ def flac_frames(path):
         size = int(line.split(",")[2])
         frames.append(data[pos:pos + size])
         pos += size
-    return data[:42], frames
+    return data[start:start + 42], frames
 
 
 def wav_pcm(path):
@@ -109,7 +112,7 @@ def main(media, out):
     for root, _, names in os.walk(media):
         files += [os.path.join(root, n) for n in sorted(names)]
     samples = [f for f in files if os.path.splitext(f)[1] in
-               (".mp4", ".mov", ".m4a", ".3gp", ".wav", ".flac", ".ogg", ".amr", ".awb")]
+               (".mp4", ".mov", ".m4a", ".3gp", ".wav", ".flac", ".ogg", ".oga", ".amr", ".awb", ".mp3")]
 
     for f in samples:
         write(out, "fuzz_extractor", os.path.basename(f), open(f, "rb").read())

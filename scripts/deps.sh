@@ -4,7 +4,8 @@
 set -euo pipefail
 packages=(cmake g++ make pkg-config git libgtest-dev libgmock-dev libbenchmark-dev
           libflac-dev libogg-dev libvorbis-dev libsoxr-dev libyuv-dev libpng-dev
-          ffmpeg flac sox libsox-fmt-all python3)
+          ffmpeg flac sox libsox-fmt-all python3
+          vorbis-tools id3v2 sound-theme-freedesktop)  # tests/media/gen/foreign_audio.sh
 fuzz_packages=(clang libclang-rt-dev)
 [ "${1:-}" = "--fuzz" ] && packages+=("${fuzz_packages[@]}")
 missing=()

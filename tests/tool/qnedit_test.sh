@@ -95,5 +95,38 @@ check "bad number" expect_status 2 "$qnedit" trim "$samples/clip.mp4" "$work/x.m
 check "unknown option" expect_status 2 "$qnedit" probe --colour "$samples/clip.mp4"
 check "help" "$qnedit" trim --help
 
+# Files of other producers (tests/media/gen/foreign_audio.sh): RF64, pipe-written
+# and G.711 WAVE trimmed sample-exactly (ffmpeg decodes the same span of the
+# source), FLAC behind an ID3v2 tag, chained Ogg, and refusals that say why.
+foreign="$(dirname "$0")/../media/foreign"
+refused="$(dirname "$0")/../media/refused"
+for f in rf64.wav bw64.wav pipe.wav alaw.wav mulaw_ext.wav id3.flac chain_same.ogg bell.oga; do
+  check "probe $f" "$qnedit" --quiet probe "$foreign/$f"
+done
+check "chained ogg lasts both links" bash -c "'$qnedit' probe --json '$foreign/chain_same.ogg' | python3 -c '
+import json, sys
+j = json.load(sys.stdin)
+assert j[\"durationUs\"] == 2300000 and j[\"tracks\"][0][\"samples\"] == 102, j
+'"
+for f in rf64.wav pipe.wav alaw.wav mulaw_ext.wav; do
+  check "trim $f" "$qnedit" --quiet trim "$foreign/$f" "$work/foreign_$f" --start 0.1 --end 0.3
+  have ffmpeg && check "trimmed $f holds the source's samples" bash -c "
+    r=\$(ffprobe -v error -show_entries stream=sample_rate -of csv=p=0 '$foreign/$f')
+    cmp <(ffmpeg -v error -i '$foreign/$f' -af atrim=start_sample=\$((r / 10)):end_sample=\$((r * 3 / 10)) -f s16le -) \
+        <(ffmpeg -v error -i '$work/foreign_$f' -f s16le -)"
+done
+check "trim tagged flac" "$qnedit" --quiet trim "$foreign/id3.flac" "$work/foreign_id3.flac" --start 0.1 --end 0.4
+have flac && check "trimmed tagged flac passes flac -t" flac --test --silent "$work/foreign_id3.flac"
+check "waveform of mu-law wav" "$qnedit" waveform "$foreign/mulaw.wav" -o "$work/foreign_w.png"
+check "waveform of tagged flac" "$qnedit" waveform "$foreign/id3.flac" -o "$work/foreign_f.png"
+while IFS='|' read -r f why; do
+  check "$f refused" expect_status 1 "$qnedit" probe "$refused/$f"
+  check "$f refusal says why" grep -qF "$why" "$work/err.txt"
+done <<'LIST'
+ima_adpcm.wav|WAVE encoding 17 (IMA ADPCM) is not supported
+flac_in.ogg|Ogg stream holds FLAC, which is not supported
+tagged.mp3|MP3 is not supported
+LIST
+
 echo "$pass passed, $fail failed"
 [ "$fail" -eq 0 ]

@@ -5,7 +5,9 @@ set -euo pipefail
 packages=(cmake g++ make pkg-config git libgtest-dev libgmock-dev libbenchmark-dev
           libflac-dev libogg-dev libvorbis-dev libsoxr-dev libyuv-dev libpng-dev
           ffmpeg flac sox libsox-fmt-all python3
-          vorbis-tools id3v2 sound-theme-freedesktop)  # tests/media/gen/foreign_audio.sh
+          vorbis-tools id3v2 sound-theme-freedesktop  # tests/media/gen/foreign_audio.sh
+          jq nodejs gstreamer1.0-tools gstreamer1.0-plugins-good gstreamer1.0-plugins-bad
+          gstreamer1.0-plugins-ugly gstreamer1.0-libav)  # tests/media/gen/mp4*.sh
 fuzz_packages=(clang libclang-rt-dev)
 [ "${1:-}" = "--fuzz" ] && packages+=("${fuzz_packages[@]}")
 missing=()

@@ -20,7 +20,6 @@ using namespace audiotest;
 namespace {
 
 typedef MediaTrack::ReadOptions O;
-typedef sp<IMediaExtractor> (*Create)(const sp<DataSource>&);
 
 std::vector<Sample> ReadAll(const sp<IMediaExtractor>& extractor, status_t* end = nullptr, const O* first = nullptr,
                             size_t limit = 1000000) {
@@ -276,19 +275,8 @@ TEST(ForeignAudioTest, RefusalsSayWhy) {
 }
 
 TEST(ForeignAudioTest, NewReadersSurviveTruncationAndCorruption) {
-    const struct {
-        const char* file;
-        Create create;
-        size_t dense, step;
-    } cases[] = {
-        {"foreign/rf64.wav", CreateWAVExtractor, 120, 997},
-        {"foreign/mulaw_ext.wav", CreateWAVExtractor, 100, 499},
-        {"foreign/id3.flac", CreateFLACExtractor, 0, 499},
-        {"foreign/chain_same.ogg", CreateOggExtractor, 0, 211},
-    };
-    for (const auto& c : cases) {
-        SCOPED_TRACE(c.file);
-        ExerciseHostileCopies(ReadFile(c.file), c.dense, c.step, c.create);
-    }
+    // The wrapper sweeps take RF64, pipe-written and A-law WAVE, id3.flac and
+    // the chains; these are the forms they do not.
+    ExerciseHostileCopies(ReadFile("foreign/mulaw_ext.wav"), 100, 499, CreateWAVExtractor);
     ExerciseHostileCopies(TaggedFlac(20), 60, 997, CreateFLACExtractor);
 }

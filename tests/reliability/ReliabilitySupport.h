@@ -64,6 +64,12 @@ inline std::vector<SampleFile> sampleFiles() {
             }
         }
     }
+    // Other producers' variants (RF64, pipe-written and G.711 WAVE, tagged
+    // FLAC, chained Ogg), one of each kind.
+    const std::string foreign = std::string(ME_TEST_MEDIA_DIR) + "/foreign/";
+    for (const char* name : {"rf64.wav", "pipe.wav", "alaw.wav", "id3.flac", "chain_same.ogg", "chain_rate.ogg"}) {
+        files.push_back({name, foreign + name, readFile(foreign + name), std::string(name) == "id3.flac"});
+    }
     return files;
 }
 

@@ -128,5 +128,16 @@ flac_in.ogg|Ogg stream holds FLAC, which is not supported
 tagged.mp3|MP3 is not supported
 LIST
 
+# Fragmented MP4 (tests/media/gen/mp4_fragmented.sh): probed with every sample
+# the producer wrote, and trimmed into a plain MP4.
+frag="$(dirname "$0")/../media/mp4"
+check "probe fragmented mp4" bash -c "'$qnedit' probe --json '$frag/frag_gst.mp4' | python3 -c '
+import json, sys
+j = json.load(sys.stdin)
+assert [t[\"samples\"] for t in j[\"tracks\"]] == [40, 36] and j[\"tracks\"][0][\"syncSamples\"] == 2, j
+'"
+check "trim fragmented mp4" "$qnedit" --quiet trim "$frag/frag_mediabunny.mp4" "$work/frag_cut.mp4" --start 0.5 --end 1.5
+have ffprobe && check "trimmed fragmented mp4 lasts the span" near "$(duration "$work/frag_cut.mp4")" 1.0 0.05
+
 echo "$pass passed, $fail failed"
 [ "$fail" -eq 0 ]

@@ -4,6 +4,7 @@
 #include <algorithm>
 
 #include <log/log.h>
+#include <media/stagefright/ExtractorRefusal.h>
 #include <media/stagefright/MediaErrors.h>
 
 #include "mpeg4/MPEG4Box.h"
@@ -101,6 +102,7 @@ status_t LayOutEdits(const std::vector<Edit>& edits, uint32_t movieTimescale, ui
         // An empty edit's rate means nothing; writers leave any value there.
         if (e.rate != kRateOne) {
             ALOGE("edit %zu plays at rate %d/65536; only rate 1 is supported", i, int32_t(e.rate));
+            setRefusalReason("MP4 edit list with a media rate other than 1 is not supported");
             return ERROR_UNSUPPORTED;
         }
         if (layout->segments.size() == kMaxSegments) return Malformed("too many segments");

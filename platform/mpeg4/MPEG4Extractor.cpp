@@ -4,6 +4,7 @@
 #include <algorithm>
 
 #include <log/log.h>
+#include <media/stagefright/ExtractorRefusal.h>
 #include <media/stagefright/MediaDefs.h>
 #include <media/stagefright/MediaErrors.h>
 
@@ -92,6 +93,7 @@ status_t MPEG4Extractor::readFragments(const std::vector<std::pair<off64_t, mpeg
     std::vector<uint8_t> moof;
     for (const auto& f : fragments) {
         if (f.second.payloadSize() > kMaxIndexBytes) {
+            setRefusalReason("damaged MP4 fragment at byte %lld", (long long)f.first);
             return ERROR_MALFORMED;
         }
         moof.resize(f.second.payloadSize());
@@ -102,6 +104,7 @@ status_t MPEG4Extractor::readFragments(const std::vector<std::pair<off64_t, mpeg
             break;
         }
         if (err != OK) {
+            setRefusalReason("damaged MP4 fragment at byte %lld", (long long)f.first);
             return err;
         }
     }

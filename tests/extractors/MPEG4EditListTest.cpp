@@ -5,6 +5,7 @@
 
 #include <cstdlib>
 
+#include <media/stagefright/ExtractorRefusal.h>
 #include <media/stagefright/FileSource.h>
 #include <media/stagefright/MediaErrors.h>
 
@@ -112,7 +113,9 @@ TEST(MPEG4EditListTest, EditsAtAnotherRateAreRefused) {
     // Half speed; a dwell (rate 0) is refused the same way.
     for (uint32_t rate : {0x8000u, 0u}) {
         f.tracks[0].edts = Box("edts", FullBox("elst", 0, 0, BE32(1) + BE32(100) + BE32(0) + BE32(rate)));
+        clearRefusalReason();
         EXPECT_EQ(nullptr, OpenBytes(Build(f)));
+        EXPECT_EQ("MP4 edit list with a media rate other than 1 is not supported", peekRefusalReason());
     }
     // An empty edit's rate is not looked at.
     f.tracks[0].edts = Box("edts", FullBox("elst", 0, 0, BE32(2) + BE32(10) + BE32(0xFFFFFFFF) + BE32(0) + BE32(100) +

@@ -3,6 +3,7 @@
 
 #include <gtest/gtest.h>
 
+#include <media/stagefright/ExtractorRefusal.h>
 #include <media/stagefright/MediaErrors.h>
 
 #include "LogCapture.h"
@@ -169,7 +170,9 @@ TEST(MPEG4FragmentTest, DamagedFragmentsRefuseTheFile) {
         SCOPED_TRACE(d.what);
         std::string bad = good;
         bad.replace(d.at, 4, BE32(d.value));
+        clearRefusalReason();
         EXPECT_EQ(nullptr, OpenBytes(bad));
+        EXPECT_EQ(0u, peekRefusalReason().find("damaged MP4 fragment at byte ")) << peekRefusalReason();
     }
     // Samples wholly from defaults claim no bytes of the box: the file bounds them.
     Fragmenting defaults;

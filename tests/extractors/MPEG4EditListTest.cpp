@@ -16,6 +16,7 @@
 
 using namespace android;
 using namespace mp4test;
+using namespace mp4test::facts;
 
 namespace {
 

@@ -12,6 +12,8 @@
 #include "MPEG4TestRead.h"
 
 namespace mp4test {
+// Apart from the writer tests' types of the same names.
+namespace facts {
 
 struct Packet {
     int64_t pts, dts;
@@ -58,6 +60,7 @@ inline Facts LoadFacts(const std::string& name) {
     return f;
 }
 
+}  // namespace facts
 }  // namespace mp4test
 
 #endif

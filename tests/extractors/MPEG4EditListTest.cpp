@@ -69,10 +69,7 @@ TEST(MPEG4EditListTest, SegmentsPlayOneAfterAnother) {
         int64_t durationUs = 0;
         ASSERT_TRUE(extractor->getTrackMetaData(0)->findInt64(kKeyDuration, &durationUs));
         EXPECT_EQ(c.durationMs * 1000, durationUs);
-        sp<IMediaSource> source = extractor->getTrack(0);
-        ASSERT_EQ(OK, source->start());
-        std::vector<Read> got;
-        EXPECT_EQ(ERROR_END_OF_STREAM, ReadAll(source, &got));
+        const std::vector<Read> got = ReadTrack(extractor, 0);
         ASSERT_EQ(c.want.size(), got.size());
         for (size_t i = 0; i < got.size(); ++i) {
             EXPECT_EQ(c.want[i].first, SampleNumber(got[i])) << i;
@@ -141,10 +138,7 @@ TEST(MPEG4EditListTest, AFileCutBySegmentsPlaysEachPieceWhole) {
         int64_t durationUs = 0;
         ASSERT_TRUE(extractor->getTrackMetaData(track)->findInt64(kKeyDuration, &durationUs));
         EXPECT_EQ(950000, durationUs);
-        sp<IMediaSource> source = extractor->getTrack(track);
-        ASSERT_EQ(OK, source->start());
-        std::vector<Read> out;
-        EXPECT_EQ(ERROR_END_OF_STREAM, ReadAll(source, &out));
+        const std::vector<Read> out = ReadTrack(extractor, track);
         size_t pos = 0;
         for (const Piece& piece : kPieces) {
             SCOPED_TRACE(piece.mediaUs);

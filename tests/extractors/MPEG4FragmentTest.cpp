@@ -15,14 +15,6 @@ using namespace mp4test;
 
 namespace {
 
-std::vector<Read> ReadTrack(const sp<IMediaExtractor>& extractor, size_t index) {
-    sp<IMediaSource> source = extractor->getTrack(index);
-    EXPECT_EQ(OK, source->start());
-    std::vector<Read> samples;
-    EXPECT_EQ(ERROR_END_OF_STREAM, ReadAll(source, &samples));
-    return samples;
-}
-
 // A video track with B-frame-like composition offsets (negative ones for a
 // signed table) and an audio track with fewer, larger samples.
 File TwoTracks(bool negativeOffsets, bool uniform) {

@@ -15,14 +15,6 @@ using namespace mp4test;
 
 namespace {
 
-std::vector<Read> ReadTrack(const sp<IMediaExtractor>& extractor, size_t index, status_t expectedEnd = ERROR_END_OF_STREAM) {
-    sp<IMediaSource> source = extractor->getTrack(index);
-    EXPECT_EQ(OK, source->start());
-    std::vector<Read> samples;
-    EXPECT_EQ(expectedEnd, ReadAll(source, &samples));
-    return samples;
-}
-
 Track VideoTrack(int nalLengthSize, size_t count) {
     Track t;
     t.sampleEntry = AvcEntry(uint8_t(nalLengthSize));

@@ -12,6 +12,7 @@
 #include <media/IMediaExtractor.h>
 #include <media/stagefright/FileSource.h>
 #include <media/stagefright/MediaBufferBase.h>
+#include <media/stagefright/MediaErrors.h>
 
 #include "extractor/Sniffers.h"
 
@@ -65,6 +66,16 @@ inline android::status_t ReadAll(const android::sp<android::IMediaSource>& sourc
     android::status_t err = android::OK;
     for (Read r; out->size() < limit && (err = ReadOne(source, &r)) == android::OK;) out->push_back(r);
     return err;
+}
+
+// Starts track `index` and reads it to the end, which must be `expectedEnd`.
+inline std::vector<Read> ReadTrack(const android::sp<android::IMediaExtractor>& extractor, size_t index,
+                                   android::status_t expectedEnd = android::ERROR_END_OF_STREAM) {
+    android::sp<android::IMediaSource> source = extractor->getTrack(index);
+    EXPECT_EQ(android::OK, source->start());
+    std::vector<Read> samples;
+    EXPECT_EQ(expectedEnd, ReadAll(source, &samples));
+    return samples;
 }
 
 }  // namespace mp4test

@@ -276,6 +276,11 @@ int runTrim(const std::vector<std::string>& words) {
         bool keep = true;
         if (t.pcm && (plan.format == "wav" || plan.format == "flac")) keep = cutPcm(t, timeUs, originUs, endUs, buffer, &writeTimeUs);
         if (t.flac != nullptr) {
+            // A stream numbered by samples (blocking bit set) may still have one
+            // block size throughout; renumbering its frames would corrupt it.
+            if (buffer->size() >= 2 && (buffer->data()[1] & 0x01) != 0) {
+                inputError(inPath + ": this FLAC stream has a variable block size and cannot be trimmed losslessly");
+            }
             buffer->meta()->setInt64("timeUs", timeUs);
             sp<ABuffer> converted;
             if (!t.flac->convert(buffer, &converted)) {

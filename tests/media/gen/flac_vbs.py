@@ -183,7 +183,12 @@ def signal():
     return left, right
 
 
-def main(out_path):
+def main(out_path, uniform=False):
+    global BLOCKS
+    if uniform:
+        # Numbered by samples, yet one block size throughout: only the frame
+        # headers tell it from a fixed-blocksize stream.
+        BLOCKS = [1152]
     left, right = signal()
     sizes, pos = [], 0
     while pos < TOTAL:
@@ -209,4 +214,4 @@ def main(out_path):
 
 
 if __name__ == "__main__":
-    main(sys.argv[1])
+    main(sys.argv[1], uniform="--uniform" in sys.argv[2:])

@@ -183,6 +183,7 @@ status_t FragmentReader::addRun(ByteReader r, const TrackFragment& tf, uint64_t*
     if (track != nullptr && !mRun.empty()) {
         const status_t err = track->table.appendRun(start, *dts, mRun);
         if (err != OK) return err;
+        track->fragmented = true;
         *dts = track->table.endDts();
     }
     if (truncated) return ERROR_END_OF_STREAM;

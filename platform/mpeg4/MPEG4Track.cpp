@@ -1,6 +1,7 @@
 #define LOG_TAG "MPEG4Track"
 #include "mpeg4/MPEG4Track.h"
 
+#include <algorithm>
 #include <cstring>
 
 #include <log/log.h>
@@ -188,8 +189,11 @@ status_t FinishTrack(uint32_t movieTimescale, Track* track) {
 
     int64_t durationUs = layout.durationUs;
     if (durationUs < 0) {
-        durationUs = track->mediaDuration > 0 ? SignedTicksToUs(static_cast<int64_t>(track->mediaDuration), track->timescale)
-                                              : SignedTicksToUs(table.endDts(), track->timescale);
+        // The media header of a fragmented file covers the movie box's samples only.
+        const int64_t ticks = track->mediaDuration > 0 && !track->fragmented
+                                  ? static_cast<int64_t>(track->mediaDuration)
+                                  : std::max(static_cast<int64_t>(track->mediaDuration), table.endDts());
+        durationUs = SignedTicksToUs(ticks, track->timescale);
     }
     MetaData* meta = track->meta.get();
     meta->setInt64(kKeyDuration, durationUs);

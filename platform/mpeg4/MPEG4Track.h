@@ -30,6 +30,7 @@ struct Track {
     // What the movie box says, kept until the samples are all known.
     std::vector<Edit> edits;
     uint64_t mediaDuration = 0;  // media timescale; 0 when unknown
+    bool fragmented = false;     // samples came in movie fragments too
     uint32_t avgBitrate = 0;
     // The samples in play order (see LayOutEdits).
     std::vector<Segment> segments;

@@ -4,6 +4,7 @@
 set -euo pipefail
 packages=(cmake g++ make pkg-config git libgtest-dev libgmock-dev libbenchmark-dev
           libflac-dev libogg-dev libvorbis-dev libsoxr-dev libyuv-dev libpng-dev
+          libavcodec-dev libavutil-dev  # platform/codec: the codecs only
           ffmpeg flac sox libsox-fmt-all python3
           vorbis-tools id3v2 sound-theme-freedesktop  # tests/media/gen/foreign_audio.sh
           jq nodejs gstreamer1.0-tools gstreamer1.0-plugins-good gstreamer1.0-plugins-bad

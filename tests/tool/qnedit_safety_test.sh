@@ -98,6 +98,8 @@ head -c 200000 "$samples/clip.mp4" >"$d/short.mp4"
 check "truncated mp4" status 1 q trim "$d/short.mp4" "$d/cut.mp4" --start 1 --end 8
 check "says where" said "damaged after"
 check "no output from a damaged input" test ! -e "$d/cut.mp4"
+check "probe reports the damage too" status 1 "$qnedit" probe "$d/short.mp4"
+check "probe says where" said "damaged after"
 check "salvage" status 0 q trim "$d/short.mp4" "$d/cut.mp4" --start 1 --end 8 --salvage
 check "salvage warns" said "warning"
 check "salvaged output plays" ffmpeg -v error -i "$d/cut.mp4" -f null -

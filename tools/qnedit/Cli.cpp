@@ -4,6 +4,7 @@
 #include <cctype>
 #include <cerrno>
 #include <cmath>
+#include <cstdio>
 #include <cstdlib>
 
 namespace qnedit {
@@ -99,6 +100,12 @@ int64_t parseSeconds(const std::string& text, const std::string& what) {
     if (v < 0) usageError(what + " must not be negative");
     if (v > kMaxSeconds) usageError(what + " is out of range: " + text);
     return static_cast<int64_t>(std::llround(v * 1e6));
+}
+
+std::string formatSeconds(int64_t us) {
+    char text[32];
+    snprintf(text, sizeof(text), "%.3f s", us / 1e6);
+    return text;
 }
 
 std::vector<std::string> splitList(const std::string& text, char sep) {

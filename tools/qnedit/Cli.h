@@ -51,6 +51,8 @@ long parseIntIn(const std::string& text, const std::string& what, long lo, long 
 // A non-negative time in seconds as microseconds; values too large for any
 // recording are refused rather than overflowing.
 int64_t parseSeconds(const std::string& text, const std::string& what);
+// Microseconds as "3.360 s".
+std::string formatSeconds(int64_t us);
 // "a,b,c" -> {"a","b","c"}
 std::vector<std::string> splitList(const std::string& text, char sep = ',');
 std::string lowerExtension(const std::string& path);

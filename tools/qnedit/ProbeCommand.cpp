@@ -10,6 +10,7 @@
 #include "Input.h"
 #include "Json.h"
 #include "Progress.h"
+#include "ReadCoverage.h"
 #include "QNMediaEditorDefs.h"
 #include "QNMediaEditorUtils.h"
 
@@ -87,8 +88,9 @@ TrackFacts describeTrack(const sp<AMessage>& f) {
     return t;
 }
 
-// One pass over every sample of every track.
-void countSamples(Input& in, std::vector<TrackFacts>* tracks) {
+// One pass over every sample of every track; what it shows of damage (a
+// track whose samples stop early) goes into `coverage`.
+void countSamples(Input& in, std::vector<TrackFacts>* tracks, ReadCoverage* coverage) {
     QNMediaExtractorWrapper& w = in.wrapper();
     for (size_t i = 0; i < in.trackCount(); ++i) w.selectTrack(i);
     const int64_t duration = in.durationUs();
@@ -102,9 +104,16 @@ void countSamples(Input& in, std::vector<TrackFacts>* tracks) {
             int32_t sync = 0;
             if (meta->findInt32(kKeyIsSyncFrame, &sync) && sync) ++t.syncSamples;
             int64_t time;
-            if (meta->findInt64(kKeyTime, &time)) progress.update(time);
+            if (meta->findInt64(kKeyTime, &time)) {
+                coverage->saw(index, time);
+                progress.update(time);
+            }
         }
         if (w.advance() != OK) break;
+    }
+    for (size_t i = 0; i < in.trackCount(); ++i) {
+        int64_t trackUs = -1;
+        if (in.trackFormat(i)->findInt64("durationUs", &trackUs) && trackUs > 0) coverage->expectReach(i, trackUs);
     }
 }
 
@@ -220,7 +229,8 @@ int runProbe(const std::vector<std::string>& words) {
     Input in(args.positional()[0]);
     std::vector<TrackFacts> tracks;
     for (size_t i = 0; i < in.trackCount(); ++i) tracks.push_back(describeTrack(in.trackFormat(i)));
-    countSamples(in, &tracks);
+    ReadCoverage coverage;
+    countSamples(in, &tracks, &coverage);
     int64_t bitrate = -1;
     if (!in.wrapper().getTotalBitrate(&bitrate)) bitrate = -1;
     const DeviceItems items = describeItems(in);
@@ -229,6 +239,10 @@ int runProbe(const std::vector<std::string>& words) {
     } else {
         printText(in, tracks, items, bitrate);
     }
+    fflush(stdout);
+    // What could be read is shown; the damage still fails the probe.
+    const std::string damage = coverage.describe(in.path());
+    if (!damage.empty()) inputError(damage);
     return kExitOk;
 }
 

@@ -16,6 +16,8 @@ class ReadCoverage {
 public:
     // A sample of `track` presented at `timeUs` was read.
     void saw(size_t track, int64_t timeUs);
+    // A sample read lasts up to `endUs` (known for PCM and fixed-size frames).
+    void reached(size_t track, int64_t endUs);
     // Tracks of evenly spaced frames (FLAC): a jump means frames were skipped.
     void expectEvenSpacing(size_t track) { mTracks[track].even = true; }
     // The track's samples should reach `wantUs` (the requested end, or the
@@ -25,6 +27,8 @@ public:
     void fail(int64_t atUs, const std::string& cause) { noteDamage(atUs, cause); }
     // Where the damage starts, or -1 if none was seen.
     int64_t damageUs() const { return mDamageUs; }
+    // The one line naming the input and where the damage starts; empty if none.
+    std::string describe(const std::string& path) const;
     // Fails the command with one line naming the input and where the damage
     // starts, or, when salvaging, prints a warning and lets it go on.
     void report(const std::string& path, bool salvage) const;
@@ -35,6 +39,7 @@ private:
         int64_t lastUs = -1;   // latest presentation time read
         int64_t prevUs = -1;   // the previous sample's time, in read order
         int64_t stepUs = 0;    // the usual spacing
+        int64_t endUs = -1;    // the furthest known end of a sample
         bool even = false;
     };
     void noteDamage(int64_t atUs, const std::string& cause);

@@ -139,10 +139,24 @@ struct TrackState {
     bool pcm = false;
     int frameBytes = 0;   // PCM: bytes per sample frame as delivered
     int sampleRate = 0;   // PCM
+    int64_t frameUs = 0;  // FLAC: the one block size, in time
     sp<QNMediaFlacFrameConverter> flac;
     int64_t prerollUs = 0;
     TrimWindow window;
 };
+
+// A trimmable FLAC stream has one block size, read from the STREAMINFO in
+// "csd-0" (after "fLaC" and the block header); 0 when it cannot be told.
+int64_t flacFrameUs(const sp<AMessage>& format) {
+    sp<ABuffer> csd;
+    int32_t rate = 0;
+    if (!format->findBuffer("csd-0", &csd) || csd == nullptr || csd->size() < 10 ||
+        !format->findInt32("sample-rate", &rate) || rate <= 0) {
+        return 0;
+    }
+    const int64_t blockSize = csd->data()[8] << 8 | csd->data()[9];
+    return blockSize * 1000000 / rate;
+}
 
 // PCM is cut to the exact sample frame; the buffer is trimmed in place.
 bool cutPcm(const TrackState& t, int64_t timeUs, int64_t startUs, int64_t endUs, sp<ABuffer>& buffer,
@@ -173,12 +187,12 @@ int runTrim(const std::vector<std::string>& words) {
     Input in(inPath, wanted == "flac");
     const Plan plan = makePlan(args, in, outPath);
     if (in.durationUs() >= 0 && startUs >= in.durationUs()) {
-        inputError(inPath + ": --start lies past the end (" + std::to_string(in.durationUs() / 1e6) + " s)");
+        inputError(inPath + ": --start lies past the end (" + formatSeconds(in.durationUs()) + ")");
     }
     // A little slack: durations in containers are rounded.
     if (in.durationUs() >= 0 && endUs > in.durationUs() + 1000) {
-        inputError(inPath + ": --end lies past the end (" + std::to_string(in.durationUs() / 1e6) +
-                   " s); leave it out to keep everything to the end");
+        inputError(inPath + ": --end lies past the end (" + formatSeconds(in.durationUs()) +
+                   "); leave it out to keep everything to the end");
     }
 
     OutputFile out(outPath, {inPath});
@@ -200,6 +214,7 @@ int runTrim(const std::vector<std::string>& words) {
                 inputError(inPath + ": this FLAC stream has a variable block size and cannot be trimmed losslessly");
             }
             t.flac = new QNMediaFlacFrameConverter(format);
+            t.frameUs = flacFrameUs(format);
         }
         if (mime == MEDIA_MIMETYPE_AUDIO_RAW) {
             int32_t channels = 0, bits = 16;
@@ -269,6 +284,8 @@ int runTrim(const std::vector<std::string>& words) {
             coverage.fail(timeUs, describeStatus(err));
             break;
         }
+        if (t.pcm) coverage.reached(source, timeUs + int64_t(buffer->size() / t.frameBytes) * 1000000 / t.sampleRate);
+        if (t.frameUs > 0) coverage.reached(source, timeUs + t.frameUs);
         uint32_t flags = 0;
         int32_t sync = 0;
         if (meta != nullptr && meta->findInt32(kKeyIsSyncFrame, &sync) && sync) flags |= 1;

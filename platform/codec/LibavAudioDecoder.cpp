@@ -7,10 +7,10 @@
 
 #include <log/log.h>
 #include <media/stagefright/MediaErrors.h>
+#include <media/stagefright/PcmConvert.h>
 
 #include "codec/AudioDecoder.h"
 #include "codec/CodecConfig.h"
-#include "codec/PcmConvert.h"
 
 extern "C" {
 #include <libavcodec/avcodec.h>
@@ -40,13 +40,13 @@ AVCodecID CodecId(AudioCodec codec) {
     return AV_CODEC_ID_NONE;
 }
 
-bool SampleType(AVSampleFormat format, DecodedSampleType* type) {
+bool SampleType(AVSampleFormat format, PcmSampleType* type) {
     switch (av_get_packed_sample_fmt(format)) {
-        case AV_SAMPLE_FMT_U8: *type = DecodedSampleType::kU8; return true;
-        case AV_SAMPLE_FMT_S16: *type = DecodedSampleType::kS16; return true;
-        case AV_SAMPLE_FMT_S32: *type = DecodedSampleType::kS32; return true;
-        case AV_SAMPLE_FMT_FLT: *type = DecodedSampleType::kFloat; return true;
-        case AV_SAMPLE_FMT_DBL: *type = DecodedSampleType::kDouble; return true;
+        case AV_SAMPLE_FMT_U8: *type = PcmSampleType::kU8; return true;
+        case AV_SAMPLE_FMT_S16: *type = PcmSampleType::kS16; return true;
+        case AV_SAMPLE_FMT_S32: *type = PcmSampleType::kS32; return true;
+        case AV_SAMPLE_FMT_FLT: *type = PcmSampleType::kFloat; return true;
+        case AV_SAMPLE_FMT_DBL: *type = PcmSampleType::kDouble; return true;
         default: return false;
     }
 }
@@ -123,7 +123,7 @@ private:
     // count (implicit parametric stereo turning on) is mapped onto it.
     bool append(std::vector<int16_t>* pcm) {
         const int channels = mFrame->ch_layout.nb_channels;
-        DecodedSampleType type;
+        PcmSampleType type;
         if (channels <= 0 || channels > kMaxChannels || mFrame->nb_samples < 0 ||
             !SampleType(static_cast<AVSampleFormat>(mFrame->format), &type)) {
             return false;

@@ -1,4 +1,4 @@
-#include "codec/PcmConvert.h"
+#include <media/stagefright/PcmConvert.h>
 
 #include <cmath>
 #include <cstring>
@@ -12,28 +12,30 @@ int16_t FromFloat(double v) {
     return static_cast<int16_t>(r > 32767 ? 32767 : r < -32768 ? -32768 : r);
 }
 
-int16_t Sample(DecodedSampleType type, const uint8_t* p) {
+int16_t Sample(PcmSampleType type, const uint8_t* p) {
     switch (type) {
-        case DecodedSampleType::kU8:
+        case PcmSampleType::kU8:
             return static_cast<int16_t>((int(*p) - 128) * 256);
-        case DecodedSampleType::kS16: {
+        case PcmSampleType::kS16: {
             int16_t v;
             memcpy(&v, p, sizeof(v));
             return v;
         }
-        case DecodedSampleType::kS32: {
+        case PcmSampleType::kS24:
+            return static_cast<int16_t>(p[1] | (p[2] << 8));
+        case PcmSampleType::kS32: {
             int32_t v;
             memcpy(&v, p, sizeof(v));
             return static_cast<int16_t>(v >> 16);
         }
-        case DecodedSampleType::kFloat: {
+        case PcmSampleType::kFloat: {
             float v;
             memcpy(&v, p, sizeof(v));
             // Single precision, as the reference multiplies.
             const long r = std::lrintf(v * 32768.0f);
             return static_cast<int16_t>(r > 32767 ? 32767 : r < -32768 ? -32768 : r);
         }
-        case DecodedSampleType::kDouble: {
+        case PcmSampleType::kDouble: {
             double v;
             memcpy(&v, p, sizeof(v));
             return FromFloat(v);
@@ -42,20 +44,21 @@ int16_t Sample(DecodedSampleType type, const uint8_t* p) {
     return 0;
 }
 
-size_t BytesOf(DecodedSampleType type) {
+size_t BytesOf(PcmSampleType type) {
     switch (type) {
-        case DecodedSampleType::kU8: return 1;
-        case DecodedSampleType::kS16: return 2;
-        case DecodedSampleType::kS32:
-        case DecodedSampleType::kFloat: return 4;
-        case DecodedSampleType::kDouble: return 8;
+        case PcmSampleType::kU8: return 1;
+        case PcmSampleType::kS16: return 2;
+        case PcmSampleType::kS24: return 3;
+        case PcmSampleType::kS32:
+        case PcmSampleType::kFloat: return 4;
+        case PcmSampleType::kDouble: return 8;
     }
     return 1;
 }
 
 }  // namespace
 
-void AppendPcm16(DecodedSampleType type, bool planar, const uint8_t* const* planes, size_t frames,
+void AppendPcm16(PcmSampleType type, bool planar, const uint8_t* const* planes, size_t frames,
                  size_t channels, std::vector<int16_t>* out) {
     const size_t bytes = BytesOf(type);
     const size_t base = out->size();

@@ -139,5 +139,26 @@ assert [t[\"samples\"] for t in j[\"tracks\"]] == [40, 36] and j[\"tracks\"][0][
 check "trim fragmented mp4" "$qnedit" --quiet trim "$frag/frag_mediabunny.mp4" "$work/frag_cut.mp4" --start 0.5 --end 1.5
 have ffprobe && check "trimmed fragmented mp4 lasts the span" near "$(duration "$work/frag_cut.mp4")" 1.0 0.05
 
+# Waveforms of compressed audio and of PCM the builder does not take as it is
+# (8-bit, float, six channels): the same values as from ffmpeg's conversion to
+# 16-bit WAV (within 1); also for the audio of a video, and with --track.
+media="$(dirname "$0")/../media"
+wave_values() { "$qnedit" waveform "$@" | python3 -c 'import json, sys; print(*json.load(sys.stdin)["values"])'; }
+for f in "$media/mp4/aac.m4a" "$media/audio/nb.amr" "$media/audio/stereo.ogg" "$media/codec/mp3.mp4" "$samples/clip.mp4" \
+         "$media/audio/u8_mono.wav" "$media/audio/f32_mono.wav" "$media/audio/s24_ext_6ch.wav"; do
+  have ffmpeg || break
+  n=$(basename "$f")
+  # The six channels of that file are one: their mean is the first.
+  mix=(); [[ $n == *6ch* ]] && mix=(-af 'pan=mono|c0=c0')
+  ffmpeg -nostdin -v error -y -i "$f" -vn "${mix[@]}" -c:a pcm_s16le "$work/dec_$n.wav"
+  check "waveform of $n as of its wav" python3 -c '
+import sys
+a, b = (list(map(int, open(p).read().split())) for p in sys.argv[1:])
+assert len(a) == len(b) and all(abs(x - y) <= 1 for x, y in zip(a, b)), (len(a), len(b))
+' <(wave_values "$f") <(wave_values "$work/dec_$n.wav")
+done
+check "waveform --track 1 of a video" cmp <(wave_values "$samples/clip.mp4") <(wave_values "$samples/clip.mp4" --track 1)
+check "waveform --track of a video track refused" expect_status 1 "$qnedit" waveform "$samples/clip.mp4" --track 0
+
 echo "$pass passed, $fail failed"
 [ "$fail" -eq 0 ]

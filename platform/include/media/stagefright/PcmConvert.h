@@ -1,5 +1,5 @@
-#ifndef PLATFORM_CODEC_PCM_CONVERT_H_
-#define PLATFORM_CODEC_PCM_CONVERT_H_
+#ifndef PCM_CONVERT_H_
+#define PCM_CONVERT_H_
 
 #include <cstddef>
 #include <cstdint>
@@ -7,14 +7,14 @@
 
 namespace android {
 
-// Sample layouts decoders hand out.
-enum class DecodedSampleType { kU8, kS16, kS32, kFloat, kDouble };
+// Sample layouts of decoders and PCM files (24-bit: packed little-endian).
+enum class PcmSampleType { kU8, kS16, kS24, kS32, kFloat, kDouble };
 
 // Appends `frames` frames of `channels` channels to *out as interleaved
 // 16-bit. `planes` holds one pointer per channel when planar, else one.
 // Float is scaled by 32768, rounded to nearest and clipped, as the reference
 // decodes it.
-void AppendPcm16(DecodedSampleType type, bool planar, const uint8_t* const* planes, size_t frames,
+void AppendPcm16(PcmSampleType type, bool planar, const uint8_t* const* planes, size_t frames,
                  size_t channels, std::vector<int16_t>* out);
 
 }  // namespace android

@@ -48,6 +48,11 @@ struct PcmTrack {
     size_t index = 0;
     int32_t channels = 0, sampleRate = 0, bits = 16;
     sp<AMessage> format;
+
+    // How long `bytes` of this PCM last.
+    int64_t durationUs(size_t bytes) const {
+        return static_cast<int64_t>(bytes / (channels * (bits / 8))) * 1000000 / sampleRate;
+    }
 };
 
 PcmTrack findPcm(const Input& in) {
@@ -73,7 +78,7 @@ PcmTrack findPcm(const Input& in) {
 class Background {
 public:
     Background(Input& in, const PcmTrack& bgm, const PcmTrack& main, int64_t offsetMs)
-        : mIn(in), mFrameBytes(main.channels * (main.bits / 8)) {
+        : mIn(in), mBgm(bgm), mFrameBytes(main.channels * (main.bits / 8)) {
         mConverter = new QNMediaAudioConverter();
         if (!mConverter->init(bgm.sampleRate, bgm.channels, bgm.bits, main.sampleRate, main.channels, main.bits)) {
             inputError(in.path() + ": the background cannot be converted");
@@ -139,6 +144,7 @@ private:
             if (mDurationUs > 0) mCoverage.expectReach(0, mDurationUs);
             return;
         }
+        mCoverage.reached(0, timeUs + mBgm.durationUs(buffer->size()));
         w.advance();
         ensureOutput(std::max<int>(static_cast<int>(buffer->size()), 65536));
         const int made = mConverter->process(buffer->data(), mOut, static_cast<int>(buffer->size()));
@@ -152,6 +158,7 @@ public:
 
 private:
     Input& mIn;
+    const PcmTrack mBgm;
     const size_t mFrameBytes;
     const int64_t mDurationUs = mIn.durationUs();
     ReadCoverage mCoverage;
@@ -227,6 +234,7 @@ int runMix(const std::vector<std::string>& words) {
             coverage.fail(time, describeStatus(err));
             break;
         }
+        coverage.reached(main.index, time + main.durationUs(buffer->size()));
         std::vector<uint8_t> aux = background.take(buffer->size());
         if (!aux.empty() && effect->writeAux(aux.data(), static_cast<int>(aux.size())) < 0) {
             inputError("the mixer could not take the background audio");

@@ -19,6 +19,12 @@
 
 namespace android {
 
+namespace {
+// Samples are gathered into writes of this size: a long copy otherwise makes
+// one system call per sample.
+constexpr size_t kWriteBuffer = 1 << 20;
+}  // namespace
+
 struct MPEG4Writer::Impl {
     Impl(int fd, FileBrand brand)
         : fd(fd), m4a(brand == FileBrand::kM4a), sharedItems(m4a ? "QNM4AWriter" : "MPEG4Writer") {}
@@ -87,7 +93,7 @@ status_t MPEG4Writer::Impl::start(MetaData* params) {
         result = err;
         return err;
     };
-    sink = new FdSink(fd);
+    sink = new FdSink(fd, kWriteBuffer);
     if (sink->initCheck() != OK) {
         ALOGE("no file descriptor to write to");
         return fail(BAD_VALUE);
@@ -97,7 +103,10 @@ status_t MPEG4Writer::Impl::start(MetaData* params) {
     mdatStart = static_cast<int64_t>(header.size());
     const std::string placeholder = Mp4MdatPlaceholder();
     header.bytes(placeholder.data(), placeholder.size());
-    if (const status_t err = header.writeTo(sink.get())) {
+    // Written through at once, so that an output that takes nothing fails start().
+    status_t headerError = header.writeTo(sink.get());
+    if (headerError == OK) headerError = sink->flush();
+    if (const status_t err = headerError) {
         ALOGE("cannot write the file header");
         return fail(err);
     }
@@ -208,7 +217,11 @@ status_t MPEG4Writer::Impl::finishFile() {
         ALOGE("cannot write the movie box");
         return err;
     }
-    if (trackError != OK) return trackError;
+    if (trackError != OK) {
+        // The tracks that could be finished still make a playable file.
+        const status_t flushed = sink->flush();
+        return flushed != OK ? flushed : trackError;
+    }
     // The file is complete only once it is on the device, as for the other writers.
     return sink->sync();
 }

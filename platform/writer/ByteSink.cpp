@@ -31,7 +31,7 @@ status_t ByteSink::writeLE32(uint32_t v) {
     return write(b, 4);
 }
 
-FdSink::FdSink(int fd) : mFd(fd), mBase(0), mPosition(0) {
+FdSink::FdSink(int fd, size_t bufferBytes) : mFd(fd), mBase(0), mPosition(0), mCapacity(bufferBytes) {
     if (fd < 0) return;
     const off_t current = lseek(fd, 0, SEEK_CUR);
     mBase = current > 0 ? current : 0;
@@ -58,20 +58,47 @@ status_t FdSink::pwriteAll(int64_t fileOffset, const void* data, size_t size) {
     return OK;
 }
 
+status_t FdSink::flush() {
+    if (mError != OK || mBuffer.empty()) return mError;
+    const int64_t start = mPosition - static_cast<int64_t>(mBuffer.size());
+    mError = pwriteAll(mBase + start, mBuffer.data(), mBuffer.size());
+    mBuffer.clear();
+    return mError;
+}
+
 status_t FdSink::write(const void* data, size_t size) {
-    const status_t err = pwriteAll(mBase + mPosition, data, size);
-    if (err == OK) mPosition += static_cast<int64_t>(size);
-    return err;
+    if (mCapacity == 0) {
+        const status_t err = pwriteAll(mBase + mPosition, data, size);
+        if (err == OK) mPosition += static_cast<int64_t>(size);
+        return err;
+    }
+    if (mError != OK) return mError;
+    if (mBuffer.size() + size > mCapacity) {
+        if (const status_t err = flush()) return err;
+    }
+    if (size >= mCapacity) {
+        // Large appends skip the copy into the buffer.
+        mError = pwriteAll(mBase + mPosition, data, size);
+        if (mError != OK) return mError;
+    } else {
+        if (mBuffer.capacity() < mCapacity) mBuffer.reserve(mCapacity);
+        const uint8_t* p = static_cast<const uint8_t*>(data);
+        mBuffer.insert(mBuffer.end(), p, p + size);
+    }
+    mPosition += static_cast<int64_t>(size);
+    return OK;
 }
 
 status_t FdSink::writeAt(int64_t offset, const void* data, size_t size) {
     if (offset < 0 || offset + static_cast<int64_t>(size) > mPosition) return BAD_VALUE;
+    if (const status_t err = flush()) return err;
     return pwriteAll(mBase + offset, data, size);
 }
 
 status_t FdSink::readAt(int64_t offset, void* data, size_t size) {
     if (mFd < 0) return NO_INIT;
     if (offset < 0 || offset + static_cast<int64_t>(size) > mPosition) return BAD_VALUE;
+    if (const status_t err = flush()) return err;
     uint8_t* p = static_cast<uint8_t*>(data);
     while (size > 0) {
         const ssize_t n = pread(mFd, p, size, mBase + offset);
@@ -86,6 +113,7 @@ status_t FdSink::readAt(int64_t offset, void* data, size_t size) {
 
 status_t FdSink::sync() {
     if (mFd < 0) return NO_INIT;
+    if (const status_t err = flush()) return err;
     // Pipes and character devices cannot be synced; that is not a failure.
     // Anything else (EIO, ENOSPC, EDQUOT on file systems that allocate late)
     // means the data may not be on the device.

@@ -4,6 +4,7 @@
 #include <cstddef>
 #include <cstdint>
 #include <string>
+#include <vector>
 #include <sys/types.h>
 
 #include <utils/Errors.h>
@@ -39,15 +40,23 @@ protected:
 
 // A caller's descriptor, written from its current offset on; the caller keeps
 // ownership of the descriptor.
+//
+// With a buffer, appends are gathered into writes of that many bytes (appends
+// at least that large go straight to the descriptor). A failed write is then
+// answered by the call that flushed: an append, writeAt, readAt, flush or sync,
+// and every later call answers it again. What is still buffered when the sink
+// goes is dropped (the caller may have closed or reused the descriptor).
 class FdSink : public ByteSink {
 public:
-    explicit FdSink(int fd);
+    explicit FdSink(int fd, size_t bufferBytes = 0);
     status_t initCheck() const { return mFd >= 0 ? OK : NO_INIT; }
     status_t write(const void* data, size_t size) override;
     status_t writeAt(int64_t offset, const void* data, size_t size) override;
     int64_t position() const override { return mPosition; }
     // Needs a descriptor opened for reading too.
     status_t readAt(int64_t offset, void* data, size_t size) override;
+    // Writes out what is buffered.
+    status_t flush();
     // Pushes what was written to the device; a negated errno when that
     // fails (descriptors that cannot be synced, like pipes, answer OK).
     status_t sync();
@@ -56,7 +65,10 @@ private:
     status_t pwriteAll(int64_t fileOffset, const void* data, size_t size);
     int mFd;
     int64_t mBase;      // file offset of byte 0 of the sink
-    int64_t mPosition;  // bytes appended
+    int64_t mPosition;  // bytes appended, buffered ones included
+    size_t mCapacity;   // 0: every append is written at once
+    std::vector<uint8_t> mBuffer;  // the last mBuffer.size() bytes appended
+    status_t mError = OK;          // of a failed buffered write
 };
 
 // Bytes in memory, for tests and for building boxes before they are sized.

@@ -36,6 +36,25 @@ bool FindLinkEnd(OggPageReader* reader, OggLink* link) {
     return false;
 }
 
+// How long the Vorbis links from `start` on last, each at its own rate: what
+// a file holds beyond the links one track can carry. Links that are not
+// Vorbis count for nothing.
+int64_t UnreadUs(OggPageReader* reader, const sp<DataSource>& source, off64_t start) {
+    int64_t us = 0;
+    for (size_t n = 0; n < OggChain::kMaxLinks; ++n) {
+        VorbisHeaders headers;
+        if (headers.read(source, start) != OK || headers.sampleRate() == 0) return us;
+        OggLink link;
+        link.serial = headers.serial();
+        link.audioStart = headers.audioStart();
+        const bool more = FindLinkEnd(reader, &link);
+        if (link.samples > 0) us += link.samples * 1000000 / headers.sampleRate();
+        if (!more) return us;
+        start = link.end;
+    }
+    return us;
+}
+
 }  // namespace
 
 std::shared_ptr<const OggChain> OggChain::Scan(const sp<DataSource>& source, const VorbisHeaders& first) {
@@ -65,6 +84,7 @@ std::shared_ptr<const OggChain> OggChain::Scan(const sp<DataSource>& source, con
                   chain->mLinks.size() + 1, headers.sampleRate(), headers.channels(), first.sampleRate(),
                   first.channels());
             chain->mEndStatus = ERROR_UNSUPPORTED;
+            chain->mUnreadUs = UnreadUs(&reader, source, link.end);
             break;
         }
         if (chain->mLinks.size() == kMaxLinks) {

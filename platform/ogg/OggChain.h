@@ -40,11 +40,15 @@ public:
     // What reading past the last link gives: ERROR_END_OF_STREAM, or
     // ERROR_UNSUPPORTED when a link follows that this track cannot carry.
     status_t endStatus() const { return mEndStatus; }
+    // How long the Vorbis links after the last one carried last: the file's
+    // duration counts them, so a reader that stops early can tell.
+    int64_t unreadUs() const { return mUnreadUs; }
 
 private:
     OggChain() = default;
     std::vector<OggLink> mLinks;
     status_t mEndStatus = 0;
+    int64_t mUnreadUs = 0;
 };
 
 }  // namespace android

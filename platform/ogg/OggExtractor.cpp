@@ -36,7 +36,7 @@ OggExtractor::OggExtractor(const sp<DataSource>& source, const std::shared_ptr<c
     const int64_t last = chain->totalSamples();
     int64_t durationUs = 0;
     if (last > 0) {
-        durationUs = TicksToUs(static_cast<uint64_t>(last), headers->sampleRate());
+        durationUs = TicksToUs(static_cast<uint64_t>(last), headers->sampleRate()) + chain->unreadUs();
         t->setInt64(kKeyDuration, durationUs);
     }
     off64_t size;

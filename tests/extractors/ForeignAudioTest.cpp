@@ -212,7 +212,10 @@ TEST(ForeignAudioTest, ChainedOggLinksFollowOnOneTimeLine) {
         }
         EXPECT_EQ(i, samples.size());
         EXPECT_EQ(kept, base);
-        EXPECT_EQ(Duration(extractor), base * 1000000 / rate);
+        // A link the track cannot carry still counts in the file's duration,
+        // so a reader stopping before it can tell that something is missing.
+        const int64_t unreadUs = c.end == ERROR_UNSUPPORTED ? FactInt("foreign/link_c.ogg", "frames") * 1000000 / 16000 : 0;
+        EXPECT_NEAR(Duration(extractor), base * 1000000 / rate + unreadUs, 1000);
     }
 }
 

@@ -100,6 +100,7 @@ check "says where" said "damaged after"
 check "no output from a damaged input" test ! -e "$d/cut.mp4"
 check "probe reports the damage too" status 1 "$qnedit" probe "$d/short.mp4"
 check "probe says where" said "damaged after"
+check "an unreadable second Ogg link is not passed off as the whole" status 1 "$qnedit" probe "$(dirname "$0")/../media/foreign/chain_rate.ogg"
 check "salvage" status 0 q trim "$d/short.mp4" "$d/cut.mp4" --start 1 --end 8 --salvage
 check "salvage warns" said "warning"
 check "salvaged output plays" ffmpeg -v error -i "$d/cut.mp4" -f null -

@@ -6,6 +6,7 @@
 #include <new>
 
 #include <log/log.h>
+#include <media/stagefright/FLACCrc.h>
 
 namespace android {
 namespace qnmediaeditor {
@@ -14,7 +15,6 @@ namespace {
 
 constexpr size_t kStreamInfoHeaderSize = 42;  // "fLaC" + block header + STREAMINFO body
 constexpr uint32_t kMaxCodeSize = 7;
-constexpr uint32_t kSlices = 16;
 
 // VORBIS_COMMENT, last block: 40 bytes of vendor string and no comments.
 const uint8_t kVorbisCommentBlock[44] = {
@@ -23,132 +23,6 @@ const uint8_t kVorbisCommentBlock[44] = {
     '1', '.', '3', '.', '2', ' ', '2', '0', '1', '7', '0', '1', '0', '1',
     0x00, 0x00, 0x00, 0x00,
 };
-
-// MSB-first, initial value 0, no reflection, no final XOR (FLAC frame header and footer).
-struct Crc8Table {
-    uint8_t t[256];
-};
-constexpr Crc8Table makeCrc8Table() {
-    Crc8Table table{};
-    for (int i = 0; i < 256; ++i) {
-        uint8_t crc = static_cast<uint8_t>(i);
-        for (int bit = 0; bit < 8; ++bit) {
-            crc = static_cast<uint8_t>((crc & 0x80) ? (crc << 1) ^ 0x07 : crc << 1);
-        }
-        table.t[i] = crc;
-    }
-    return table;
-}
-
-struct Crc16Table {
-    uint32_t t[256];
-};
-constexpr Crc16Table makeCrc16Table() {
-    Crc16Table table{};
-    for (int i = 0; i < 256; ++i) {
-        uint32_t crc = static_cast<uint32_t>(i) << 8;
-        for (int bit = 0; bit < 8; ++bit) {
-            crc = ((crc & 0x8000) ? (crc << 1) ^ 0x8005 : crc << 1) & 0xFFFF;
-        }
-        table.t[i] = crc;
-    }
-    return table;
-}
-
-constexpr Crc8Table kCrc8 = makeCrc8Table();
-constexpr Crc16Table kCrc16 = makeCrc16Table();
-
-// slice[k][x]: the CRC-16 of byte x followed by k zero bytes.
-struct Crc16Slices {
-    uint16_t t[kSlices][256];
-};
-constexpr Crc16Slices makeCrc16Slices() {
-    Crc16Slices s{};
-    for (int x = 0; x < 256; ++x) s.t[0][x] = static_cast<uint16_t>(kCrc16.t[x]);
-    for (uint32_t k = 1; k < kSlices; ++k) {
-        for (int x = 0; x < 256; ++x) {
-            const uint16_t prev = s.t[k - 1][x];
-            s.t[k][x] = static_cast<uint16_t>((prev << 8) ^ kCrc16.t[prev >> 8]);
-        }
-    }
-    return s;
-}
-constexpr Crc16Slices kCrc16Slices = makeCrc16Slices();
-
-uint16_t crc16Plain(uint16_t crc, const unsigned char* data, uint32_t size) {
-    for (uint32_t i = 0; i < size; ++i) {
-        crc = static_cast<uint16_t>((kCrc16.t[(crc >> 8) ^ data[i]] ^ (crc << 8)) & 0xFFFF);
-    }
-    return crc;
-}
-
-inline uint16_t sliceStep(uint16_t crc, uint64_t w0, uint64_t w1) {
-    const auto& T = kCrc16Slices.t;
-    auto b = [](uint64_t w, int k) { return static_cast<uint32_t>((w >> (8 * k)) & 0xFF); };
-    return T[15][b(w0, 0) ^ (crc >> 8)] ^ T[14][b(w0, 1) ^ (crc & 0xFF)] ^ T[13][b(w0, 2)] ^ T[12][b(w0, 3)] ^
-           T[11][b(w0, 4)] ^ T[10][b(w0, 5)] ^ T[9][b(w0, 6)] ^ T[8][b(w0, 7)] ^ T[7][b(w1, 0)] ^
-           T[6][b(w1, 1)] ^ T[5][b(w1, 2)] ^ T[4][b(w1, 3)] ^ T[3][b(w1, 4)] ^ T[2][b(w1, 5)] ^ T[1][b(w1, 6)] ^
-           T[0][b(w1, 7)];
-}
-
-static_assert(__BYTE_ORDER__ == __ORDER_LITTLE_ENDIAN__, "slice bytes are taken from little-endian words");
-
-// Sixteen bytes per step.
-uint16_t crc16Fast(uint16_t crc, const unsigned char* p, uint32_t size) {
-    for (; size >= kSlices; size -= kSlices, p += kSlices) {
-        uint64_t w[2];
-        memcpy(w, p, sizeof(w));
-        crc = sliceStep(crc, w[0], w[1]);
-    }
-    return crc16Plain(crc, p, size);
-}
-
-// Polynomials modulo the CRC-16 generator, for joining the sums of two runs.
-constexpr uint16_t mulMod(uint16_t a, uint16_t b) {
-    uint16_t r = 0;
-    for (int i = 15; i >= 0; --i) {
-        r = static_cast<uint16_t>((r & 0x8000) ? (r << 1) ^ 0x8005 : r << 1);
-        if ((b >> i) & 1) r ^= a;
-    }
-    return r;
-}
-struct Crc16Powers {
-    uint16_t t[32];  // x^(8 * 2^k) mod P
-};
-constexpr Crc16Powers makeCrc16Powers() {
-    Crc16Powers p{};
-    p.t[0] = 0x0100;
-    for (int k = 1; k < 32; ++k) p.t[k] = mulMod(p.t[k - 1], p.t[k - 1]);
-    return p;
-}
-constexpr Crc16Powers kCrc16Powers = makeCrc16Powers();
-
-// The sum of crc's message followed by n more zero bytes.
-uint16_t shiftCrc(uint16_t crc, uint32_t n) {
-    uint16_t power = 1;
-    for (int k = 0; n != 0; ++k, n >>= 1) {
-        if (n & 1) power = mulMod(power, kCrc16Powers.t[k]);
-    }
-    return mulMod(crc, power);
-}
-
-// Continues crc over size bytes. The two halves run as independent sums, so
-// their table look-ups overlap, joined by crc(A B) = crc(A) * x^(8|B|) + crc(B)
-// (there is no initial value or final XOR).
-uint16_t crc16TwoRuns(uint16_t crc, const unsigned char* p, uint32_t size) {
-    const uint32_t half = (size / 2) & ~(kSlices - 1);
-    if (half < 4 * kSlices) return crc16Fast(crc, p, size);
-    uint16_t a = crc, b = 0;
-    for (uint32_t i = 0; i < half; i += kSlices) {
-        uint64_t wa[2], wb[2];
-        memcpy(wa, p + i, sizeof(wa));
-        memcpy(wb, p + half + i, sizeof(wb));
-        a = sliceStep(a, wa[0], wa[1]);
-        b = sliceStep(b, wb[0], wb[1]);
-    }
-    b = crc16Fast(b, p + 2 * half, size - 2 * half);
-    return static_cast<uint16_t>(shiftCrc(a, size - half) ^ b);
-}
 
 // Continuation bytes of a coded number carry 6 bits each, under a 10xxxxxx prefix.
 bool isContinuation(unsigned char c) { return (c & 0xC0) == 0x80; }
@@ -293,7 +167,7 @@ bool QNMediaFlacFrameConverter::setFrameHeaderInfo(sp<ABuffer>& inBuffer, sp<ABu
     const uint32_t bodySize = static_cast<uint32_t>(inSize - 2 - (info.crc8Pos + 1));
     memcpy(dst + outPos, in + info.crc8Pos + 1, bodySize);
     outPos += bodySize;
-    const uint16_t frameCrc = crc16TwoRuns(0, dst, outDataSize - 2);
+    const uint16_t frameCrc = FLACCrc16(dst, outDataSize - 2);
     dst[outPos++] = static_cast<unsigned char>(frameCrc >> 8);
     dst[outPos++] = static_cast<unsigned char>(frameCrc & 0xFF);
     if (outPos != outDataSize) {
@@ -398,18 +272,12 @@ bool QNMediaFlacFrameConverter::makeUTF8UCS2(uint64_t value, unsigned char* out,
     return true;
 }
 
-uint8_t QNMediaFlacFrameConverter::crc8(const unsigned char* data, uint32_t size) {
-    uint8_t crc = 0;
-    for (uint32_t i = 0; i < size; ++i) crc = kCrc8.t[crc ^ data[i]];
-    return crc;
-}
+uint8_t QNMediaFlacFrameConverter::crc8(const unsigned char* data, uint32_t size) { return FLACCrc8(data, size); }
 
-uint16_t QNMediaFlacFrameConverter::crc16(const unsigned char* data, uint32_t size) {
-    return crc16Plain(0, data, size);
-}
+uint16_t QNMediaFlacFrameConverter::crc16(const unsigned char* data, uint32_t size) { return FLACCrc16(data, size); }
 
 uint16_t QNMediaFlacFrameConverter::crc16Sliced(const unsigned char* data, uint32_t size) {
-    return crc16TwoRuns(0, data, size);
+    return FLACCrc16(data, size);
 }
 
 }  // namespace qnmediaeditor

@@ -7,7 +7,7 @@
 #include <log/log.h>
 #include <media/stagefright/MediaErrors.h>
 
-#include "flac/FLACCrc.h"
+#include <media/stagefright/FLACCrc.h>
 
 namespace android {
 
@@ -56,17 +56,26 @@ const uint8_t* FLACFrameScanner::window(off64_t offset, size_t length, size_t* a
     const bool inside = offset >= mWindowStart &&
                         static_cast<uint64_t>(offset - mWindowStart) + length <= mWindow.size();
     if (!inside) {
-        const size_t want = static_cast<size_t>(std::min<uint64_t>(std::max(length, kReadSize), toEnd));
+        // Read a step past what is asked for, and keep the bytes already held
+        // from `offset` on: frames are read in order, so each byte of the file
+        // is read once, in reads of at least kReadSize.
+        const size_t want = static_cast<size_t>(std::min<uint64_t>(std::max(length, kReadSize) + kReadSize, toEnd));
+        size_t keep = 0;
+        if (offset >= mWindowStart && static_cast<uint64_t>(offset - mWindowStart) < mWindow.size()) {
+            const size_t from = static_cast<size_t>(offset - mWindowStart);
+            keep = std::min(mWindow.size() - from, want);
+            memmove(mWindow.data(), mWindow.data() + from, keep);
+        }
         mWindow.resize(want);
-        const ssize_t n = mSource->readAt(offset, mWindow.data(), want);
+        const ssize_t n = mSource->readAt(offset + static_cast<off64_t>(keep), mWindow.data() + keep, want - keep);
         if (n < 0) {
             mReadError = static_cast<status_t>(n);
             mWindow.clear();
             return nullptr;
         }
-        mWindow.resize(static_cast<size_t>(n));
+        mWindow.resize(keep + static_cast<size_t>(n));
         mWindowStart = offset;
-        if (static_cast<size_t>(n) < want) mEnd = offset + n;  // the file is shorter than it said
+        if (keep + static_cast<size_t>(n) < want) mEnd = offset + static_cast<off64_t>(mWindow.size());  // the file is shorter than it said
     }
     const size_t at = static_cast<size_t>(offset - mWindowStart);
     *available = std::min(length, mWindow.size() - at);
@@ -115,6 +124,16 @@ bool FLACFrameScanner::findEnd(const FlacFrameHeader& header, FLACFrame* frame) 
         const size_t usable = atEnd ? available : (available > kMaxHeaderBytes ? available - kMaxHeaderBytes : 0);
         const size_t stop = std::min(std::min(usable, limit), k + mBudget + 2);
         mBudget -= stop > k + 2 ? stop - (k + 2) : 0;
+        if (!completesStream) {
+            // Only an end followed by a sync code (or the end of the file) can
+            // count, so the sum is carried from one such place to the next in
+            // long runs; the last frame, which may end where a tag begins,
+            // keeps the byte loop for its fallback.
+            if (fastEnd(header, p, available, stop, frame, &crc, &k)) return true;
+            if (atEnd || k + 2 > limit || mBudget == 0) break;
+            span = std::min(span * 2, limit + kMaxHeaderBytes);
+            continue;
+        }
         for (; k + 2 <= stop; ++k) {
             if (k >= header.headerBytes && crc == ((p[k] << 8) | p[k + 1])) {
                 const size_t end = k + 2;
@@ -135,6 +154,38 @@ bool FLACFrameScanner::findEnd(const FlacFrameHeader& header, FLACFrame* frame) 
     if (fallback != 0 && completesStream) {
         frame->size = fallback;
         return true;
+    }
+    return false;
+}
+
+bool FLACFrameScanner::fastEnd(const FlacFrameHeader& header, const uint8_t* p, size_t available, size_t stop,
+                               FLACFrame* frame, uint16_t* crc, size_t* k) {
+    size_t e = std::max(*k + 2, header.headerBytes + 2);
+    for (; e <= stop; ++e) {
+        // Candidate ends: a sync code, or the last byte of the file.
+        if (e < available) {
+            const void* ff = memchr(p + e, 0xFF, std::min(stop + 1, available) - e);
+            if (ff == nullptr) {
+                e = std::min(stop + 1, available);
+                if (e > stop) break;
+            } else {
+                e = static_cast<size_t>(static_cast<const uint8_t*>(ff) - p);
+            }
+        }
+        const bool lastByte = frame->offset + static_cast<off64_t>(e) >= mEnd;
+        if (!lastByte && !(e + 1 < available && (p[e + 1] & 0xFE) == 0xF8)) continue;
+        *crc = FLACCrc16Continue(*crc, p + *k, e - 2 - *k);
+        *k = e - 2;
+        FlacFrameHeader next;
+        if (*crc == ((p[*k] << 8) | p[*k + 1]) &&
+            (lastByte || (parseHeader(p + e, available - e, &next) && follows(header, next)))) {
+            frame->size = e;
+            return true;
+        }
+    }
+    if (stop >= *k + 2) {
+        *crc = FLACCrc16Continue(*crc, p + *k, stop - 1 - *k);
+        *k = stop - 1;
     }
     return false;
 }

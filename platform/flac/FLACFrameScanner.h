@@ -49,6 +49,11 @@ private:
     bool headerAt(off64_t offset, FlacFrameHeader* header);
     // Sets frame->size; false when no end is found within the frame limit.
     bool findEnd(const FlacFrameHeader& header, FLACFrame* frame);
+    // findEnd over window bytes p[*k, stop) where only an end before a sync
+    // code or at the end of the file can count; *crc covers p[0, *k) and both
+    // are carried on when no end is found.
+    bool fastEnd(const FlacFrameHeader& header, const uint8_t* p, size_t available, size_t stop, FLACFrame* frame,
+                 uint16_t* crc, size_t* k);
     uint64_t firstSampleOf(const FlacFrameHeader& header) const;
     bool follows(const FlacFrameHeader& current, const FlacFrameHeader& next) const;
     size_t frameLimit(uint32_t blockSize) const;

@@ -1,5 +1,7 @@
 #include "flac/FlacFrameHeader.h"
 
+#include <media/stagefright/FLACCrc.h>
+
 namespace android {
 
 namespace {
@@ -52,14 +54,7 @@ bool readCodedNumber(const uint8_t* p, size_t size, bool allow36, uint64_t* valu
 
 }  // namespace
 
-uint8_t flacCrc8(const uint8_t* data, size_t size) {
-    uint8_t crc = 0;
-    for (size_t i = 0; i < size; ++i) {
-        crc ^= data[i];
-        for (int bit = 0; bit < 8; ++bit) crc = (crc & 0x80) ? uint8_t((crc << 1) ^ 0x07) : uint8_t(crc << 1);
-    }
-    return crc;
-}
+uint8_t flacCrc8(const uint8_t* data, size_t size) { return FLACCrc8(data, size); }
 
 bool FlacFrameHeader::parse(const uint8_t* p, size_t size, FlacFrameHeader* out) {
     // Sync code 0b11111111111110, a reserved 0 bit, the blocking strategy.

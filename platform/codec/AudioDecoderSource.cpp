@@ -26,10 +26,15 @@ constexpr int32_t kMaxEncoderDelay = 1 << 16;
 // needs a few frames to agree to the bit. AMR's predictors come close only.
 constexpr int64_t kSeekPrerollUs = 200000;
 
-int32_t EncoderDelay(const MetaData& format) {
-    int32_t delay = 0;
-    if (!format.findInt32(kKeyEncoderDelay, &delay) || delay < 0 || delay > kMaxEncoderDelay) return 0;
-    return delay;
+// The priming a track states as a count of samples, as time: its samples'
+// times include it, the presentation starts after it.
+int64_t EncoderDelayUs(const MetaData& format) {
+    int32_t delay = 0, rate = 0;
+    if (!format.findInt32(kKeyEncoderDelay, &delay) || delay < 0 || delay > kMaxEncoderDelay ||
+        !format.findInt32(kKeySampleRate, &rate) || rate <= 0) {
+        return 0;
+    }
+    return int64_t(delay) * 1000000 / rate;
 }
 
 // The audio/raw format of the decoded stream.
@@ -65,7 +70,7 @@ AudioDecoderSource::AudioDecoderSource(const sp<IMediaSource>& track, const sp<M
       mTrackFormat(trackFormat),
       mDecoder(AudioDecoder::Create(*trackFormat)),
       mStarted(false),
-      mSkipFrames(0),
+      mDelayUs(EncoderDelayUs(*trackFormat)),
       mStartUs(0),
       mLastFrames(0),
       mPending(nullptr) {
@@ -84,7 +89,6 @@ status_t AudioDecoderSource::start(MetaData* params) {
     status_t err = mTrack->start(params);
     if (err != OK) return err;
     mStarted = true;
-    mSkipFrames = EncoderDelay(*mTrackFormat);
     mStartUs = 0;
     mLastFrames = 0;
     err = decodeNext(nullptr);
@@ -124,9 +128,8 @@ status_t AudioDecoderSource::read(MediaBufferBase** buffer, const ReadOptions* o
         if (fresh == nullptr) return NO_MEMORY;
         mDecoder = std::move(fresh);
         mLastFrames = 0;
-        mSkipFrames = seekUs <= 0 ? EncoderDelay(*mTrackFormat) : 0;
         mStartUs = std::max<int64_t>(seekUs, 0);
-        if (mStartUs < kSeekPrerollUs) {
+        if (mStartUs + mDelayUs < kSeekPrerollUs) {
             // A track's seek lands on its first presented sample at best;
             // starting it over brings back the priming before it.
             mTrack->stop();
@@ -136,7 +139,7 @@ status_t AudioDecoderSource::read(MediaBufferBase** buffer, const ReadOptions* o
         } else {
             // Every compressed audio sample is a sync sample: decode from a
             // little before and drop what precedes the time.
-            preroll.setSeekTo(mStartUs - kSeekPrerollUs, ReadOptions::SEEK_PREVIOUS_SYNC);
+            preroll.setSeekTo(mStartUs + mDelayUs - kSeekPrerollUs, ReadOptions::SEEK_PREVIOUS_SYNC);
             options = &preroll;
         }
     } else {
@@ -184,15 +187,16 @@ status_t AudioDecoderSource::decodeNext(const ReadOptions* options) {
         if (valid >= 0 && size_t(valid) < frames) frames = valid;
 
         const int64_t rate = mDecoder->sampleRate();
-        size_t drop = 0;
-        if (timeUs < mStartUs) drop = static_cast<size_t>(((mStartUs - timeUs) * rate + 500000) / 1000000);
-        const size_t delay = static_cast<size_t>(mSkipFrames);
-        drop = std::min(frames, drop + delay);
-        mSkipFrames -= std::min<int64_t>(mSkipFrames, frames);
         nextUs = timeUs + static_cast<int64_t>(frames) * 1000000 / rate;
+        // The stated priming comes before the presentation's 0.
+        const int64_t presentedUs = timeUs - mDelayUs;
+        size_t drop = 0;
+        if (presentedUs < mStartUs) {
+            drop = std::min(frames, static_cast<size_t>(((mStartUs - presentedUs) * rate + 500000) / 1000000));
+        }
         if (drop == frames) continue;
         // What is left of a sample that began before the start is at the start.
-        const int64_t outUs = std::max(timeUs, mStartUs);
+        const int64_t outUs = std::max(presentedUs, mStartUs);
 
         const size_t bytes = (frames - drop) * channels * sizeof(int16_t);
         MediaBuffer* out = new (std::nothrow) MediaBuffer(bytes);

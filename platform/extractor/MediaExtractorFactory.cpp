@@ -17,6 +17,7 @@ const ExtractorDef kExtractors[] = {
     {"FLAC", SniffFLAC, CreateFLACExtractor},
     {"AMR", SniffAMR, CreateAMRExtractor},
     {"Ogg", SniffOgg, CreateOggExtractor},
+    {"MP3", SniffMP3, CreateMP3Extractor},
 };
 }  // namespace
 

@@ -25,6 +25,8 @@ float SniffAMR(const sp<DataSource>& source);
 sp<IMediaExtractor> CreateAMRExtractor(const sp<DataSource>& source);
 float SniffOgg(const sp<DataSource>& source);
 sp<IMediaExtractor> CreateOggExtractor(const sp<DataSource>& source);
+float SniffMP3(const sp<DataSource>& source);
+sp<IMediaExtractor> CreateMP3Extractor(const sp<DataSource>& source);
 
 }  // namespace android
 

@@ -37,7 +37,7 @@ const char* MpegAudioName(const uint8_t* h) {
     if (h[0] != 0xFF || (h[1] & 0xE0) != 0xE0) return nullptr;
     if ((h[1] & 0xF6) == 0xF0) return "AAC in ADTS";
     switch ((h[1] >> 1) & 3) {
-        case 1: return "MP3";
+        case 1: return "MP3 without whole frames (free format or damaged)";
         case 2: return "MPEG audio layer II";
         case 3: return "MPEG audio layer I";
         default: return nullptr;
@@ -52,8 +52,7 @@ const char* NameUnsupportedFormat(const sp<DataSource>& source) {
     const ssize_t n = source->readAt(start, h, sizeof(h));
     if (n < 4) return start > 0 ? "ID3-tagged data of an unknown kind" : nullptr;
     if (const char* mpeg = MpegAudioName(h)) return mpeg;
-    // Tagged data that is not MPEG audio sync at once is still most likely MP3.
-    if (start > 0) return "MP3";
+    if (start > 0) return "ID3-tagged data of an unknown kind";
     for (const Signature& s : kSignatures) {
         if (static_cast<size_t>(n) >= s.offset + s.length && memcmp(h + s.offset, s.magic, s.length) == 0) {
             return s.name;

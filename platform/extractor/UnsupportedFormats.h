@@ -5,7 +5,7 @@
 
 namespace android {
 
-// Names common formats that no extractor reads ("MP3", "Matroska/WebM"), so
+// Names common formats that no extractor reads ("AIFF", "Matroska/WebM"), so
 // that a refusal says what the file is; null for data it does not know.
 const char* NameUnsupportedFormat(const sp<DataSource>& source);
 

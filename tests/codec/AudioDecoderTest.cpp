@@ -59,9 +59,11 @@ std::vector<int16_t> WithoutConcealed(const Decoded& d, const std::string& conce
 TEST(AudioDecoderSource, DecodesAsFfmpegDoes) {
     // AAC with an edit list's priming (also the audio of a video), AMR-NB in
     // 3GP and raw, AMR-WB with comfort-noise and lost frames, Vorbis mono and
-    // stereo (cut at the last granule position), MP3 with LAME's priming.
+    // stereo (cut at the last granule position), MP3 in MP4 and in MP3 files
+    // (LAME's delay and padding dropped; tags at the end not decoded).
     for (const char* file : {"mp4/aac.m4a", "mp4/avc_aac.mp4", "mp4/amr_nb.3gp", "audio/nb.amr", "audio/wb.awb",
-                             "audio/mono.ogg", "audio/stereo.ogg", "codec/mp3.mp4"}) {
+                             "audio/mono.ogg", "audio/stereo.ogg", "codec/mp3.mp4", "mp3/vbr_tags.mp3",
+                             "mp3/cbr_mpeg2.mp3", "mp3/mpeg25_ape.mp3", "mp3/gst_cbr.mp3"}) {
         SCOPED_TRACE(file);
         const Decoded d = DecodeFile(Path(file));
         ASSERT_EQ(d.status, ERROR_END_OF_STREAM);

@@ -125,7 +125,6 @@ while IFS='|' read -r f why; do
 done <<'LIST'
 ima_adpcm.wav|WAVE encoding 17 (IMA ADPCM) is not supported
 flac_in.ogg|Ogg stream holds FLAC, which is not supported
-tagged.mp3|MP3 is not supported
 LIST
 
 # Fragmented MP4 (tests/media/gen/mp4_fragmented.sh): probed with every sample
@@ -144,7 +143,7 @@ have ffprobe && check "trimmed fragmented mp4 lasts the span" near "$(duration "
 # 16-bit WAV (within 1); also for the audio of a video, and with --track.
 media="$(dirname "$0")/../media"
 wave_values() { "$qnedit" waveform "$@" | python3 -c 'import json, sys; print(*json.load(sys.stdin)["values"])'; }
-for f in "$media/mp4/aac.m4a" "$media/audio/nb.amr" "$media/audio/stereo.ogg" "$media/codec/mp3.mp4" "$samples/clip.mp4" \
+for f in "$media/mp4/aac.m4a" "$media/audio/nb.amr" "$media/audio/stereo.ogg" "$media/codec/mp3.mp4" "$media/mp3/vbr_tags.mp3" "$samples/clip.mp4" \
          "$media/audio/u8_mono.wav" "$media/audio/f32_mono.wav" "$media/audio/s24_ext_6ch.wav"; do
   have ffmpeg || break
   n=$(basename "$f")

@@ -102,4 +102,3 @@ mkdir -p ../refused
 rm -f ../refused/*
 ff -i "$(tone 8000 1 0.1 440)" -c:a adpcm_ima_wav ../refused/ima_adpcm.wav
 ff -i "$(tone 8000 1 0.1 440)" -c:a flac -f ogg ../refused/flac_in.ogg
-ff -i "$(tone 8000 1 0.1 440)" -c:a libmp3lame -b:a 32k -id3v2_version 3 -metadata title=tagged ../refused/tagged.mp3

@@ -8,7 +8,7 @@
 #              our decoder puts silence (AMR only); "-" when none
 # Ogg Vorbis is cut to the granule position of its last page (Vorbis I, A.2),
 # which ffmpeg does not apply at the end.
-# Runs after audio.sh and mp4.sh (the names sort so): it reads their files from OUTDIR.
+# Runs after audio.sh, mp3.sh and mp4.sh (the names sort so): it reads their files from OUTDIR.
 set -euo pipefail
 out=${1:?usage: pcm_reference.sh OUTDIR}
 here=$(cd "$(dirname "$0")" && pwd)
@@ -27,8 +27,11 @@ ff "${tone[@]}" "${mix[@]}" -ac 2 -c:a libmp3lame -b:a 48k "$dir/mp3.mp4"
 facts="$dir/decoded.txt"
 : > "$facts"
 for f in mp4/aac.m4a mp4/amr_nb.3gp mp4/avc_aac.mp4 audio/nb.amr audio/wb.awb audio/mono.ogg audio/stereo.ogg \
-         codec/mp3.mp4; do
-  ff -i "$out/$f" -map 0:a:0 -f s16le "$tmp/pcm" 2>/dev/null || true
+         codec/mp3.mp4 mp3/vbr_tags.mp3 mp3/cbr_mpeg2.mp3 mp3/mpeg25_ape.mp3 mp3/gst_cbr.mp3; do
+  # The tags at the end must not change the audio (ffmpeg decodes some of them).
+  src="$out/$f"
+  [[ $f == mp3/mpeg25_ape.mp3 ]] && python3 "$here/mp3_tags.py" untagged "$src" "$tmp/untagged.mp3" && src="$tmp/untagged.mp3"
+  ff -i "$src" -map 0:a:0 -f s16le "$tmp/pcm" 2>/dev/null || true
   channels=$(probe -show_entries stream=channels -of csv=p=0 "$out/$f")
   bytes=$(stat -c %s "$tmp/pcm")
   frames=$((bytes / 2 / channels))

@@ -57,7 +57,7 @@ private:
     sp<MetaData> mFormat;
     std::unique_ptr<AudioDecoder> mDecoder;
     bool mStarted;
-    int64_t mSkipFrames;      // priming still to drop
+    const int64_t mDelayUs;   // the track's stated encoder delay
     int64_t mStartUs;         // audio before this is dropped: 0, or a seek's time
     size_t mLastFrames;       // frames of the last good decode: the length of a concealment
     MediaBufferBase* mPending;  // decoded by start() or a read that found audio

@@ -1,5 +1,6 @@
 #include "mp3/MP3FrameHeader.h"
 
+#include <algorithm>
 #include <vector>
 
 namespace android {
@@ -48,7 +49,9 @@ bool SameMP3Stream(const MP3FrameHeader& a, const MP3FrameHeader& b) {
 }
 
 off64_t FindMP3Frame(const sp<DataSource>& source, off64_t from, off64_t limit, off64_t end, MP3FrameHeader* header) {
-    std::vector<uint8_t> window(64 * 1024);
+    if (limit <= from) return -1;
+    // A sniff looks at a few bytes only: the window is no larger than the search.
+    std::vector<uint8_t> window(static_cast<size_t>(std::min<off64_t>(64 * 1024, limit - from + 3)));
     for (off64_t base = from; base < limit; base += static_cast<off64_t>(window.size()) - 3) {
         const ssize_t n = source->readAt(base, window.data(), window.size());
         if (n < 4) return -1;

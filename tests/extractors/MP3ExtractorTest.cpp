@@ -133,6 +133,12 @@ TEST(MP3Extractor, DamageIsSkippedOrReported) {
         EXPECT_GE(r.timesUs.size(), c.minFrames);
         EXPECT_LE(r.timesUs.size(), c.maxFrames);
     }
+    // Every prefix and single-byte change of a tagged file ends in a status.
+    for (const char* file : {"mp3/vbr_tags.mp3", "mp3/mpeg25_ape.mp3"}) {
+        audiotest::ExerciseHostileCopies(ReadFile(file), 256, 7, [](const sp<DataSource>& source) {
+            return sp<IMediaExtractor>(MP3Extractor::Create(source));
+        });
+    }
     // Not MP3: other MPEG audio layers, a lone sync word, tags with nothing after.
     for (const std::vector<uint8_t>& bytes : {std::vector<uint8_t>{0xFF, 0xFD, 0x90, 0x00, 0, 0, 0, 0},
                                               std::vector<uint8_t>(clean.begin(), clean.begin() + 60),

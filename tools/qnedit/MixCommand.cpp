@@ -192,6 +192,7 @@ int runMix(const std::vector<std::string>& words) {
         offset = fromSettings;
     }
     const int offsetMs = static_cast<int>(offset);
+    const std::string offsetName = args.has("--offset") ? "--offset" : "the device's background offset";
     int ditherType = 0;
     const bool haveDither = Adapter::GetUseDitherTypeFromKestro(&ditherType);
 
@@ -202,10 +203,10 @@ int runMix(const std::vector<std::string>& words) {
     // An offset outside the recordings would mix nothing: say so rather than
     // write the main audio unchanged (or hold minutes of silence).
     if (mainIn.durationUs() > 0 && int64_t(offsetMs) * 1000 >= mainIn.durationUs()) {
-        usageError("--offset " + std::to_string(offsetMs) + " ms lies past the end of the main recording");
+        usageError(offsetName + " " + std::to_string(offsetMs) + " ms lies past the end of the main recording");
     }
     if (bgmIn.durationUs() > 0 && -int64_t(offsetMs) * 1000 >= bgmIn.durationUs()) {
-        usageError("--offset " + std::to_string(offsetMs) + " ms skips all of the background");
+        usageError(offsetName + " " + std::to_string(offsetMs) + " ms skips all of the background");
     }
 
     sp<QNMediaAudioEffect> effect = new QNMediaAudioEffect();

@@ -7,6 +7,7 @@ packages=(cmake g++ make pkg-config git libgtest-dev libgmock-dev libbenchmark-d
           libavcodec-dev libavutil-dev  # platform/codec: the codecs only
           ffmpeg flac sox libsox-fmt-all python3
           vorbis-tools id3v2 sound-theme-freedesktop  # tests/media/gen/foreign_audio.sh
+          atomicparsley  # tests/media/gen/mp4.sh
           jq nodejs gstreamer1.0-tools gstreamer1.0-plugins-good gstreamer1.0-plugins-bad
           gstreamer1.0-plugins-ugly gstreamer1.0-libav)  # tests/media/gen/mp4*.sh
 fuzz_packages=(clang libclang-rt-dev)

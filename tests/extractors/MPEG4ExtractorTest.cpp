@@ -243,7 +243,7 @@ TEST_P(MPEG4FileTest, SeekModesLandOnTheRightSyncSample) {
 }
 
 INSTANTIATE_TEST_SUITE_P(Files, MPEG4FileTest,
-                         ::testing::Values("avc_aac.mp4", "avc_aac_faststart.mp4", "avc_aac.mov", "hevc.mp4", "aac.m4a",
+                         ::testing::Values("avc_aac.mp4", "avc_aac_faststart.mp4", "avc_aac_tagged.mp4", "avc_aac.mov", "hevc.mp4", "aac.m4a",
                                            "avc_rotated.mp4", "amr_nb.3gp", "frag_empty_moov.mp4",
                                            "frag_base_moof.mp4", "frag_dash.mp4", "frag_hevc.mp4", "frag_gst.mp4",
                                            "frag_mediabunny.mp4"),

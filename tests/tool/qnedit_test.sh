@@ -159,5 +159,13 @@ done
 check "waveform --track 1 of a video" cmp <(wave_values "$samples/clip.mp4") <(wave_values "$samples/clip.mp4" --track 1)
 check "waveform --track of a video track refused" expect_status 1 "$qnedit" waveform "$samples/clip.mp4" --track 0
 
+# A tagging tool's rewrite (metadata in front, index moved ahead, padding)
+# trims to the same frames as the file it came from.
+mp4media=$(dirname "$0")/../media/mp4
+check "tagged mp4 trims" "$qnedit" --quiet trim "$mp4media/avc_aac_tagged.mp4" "$work/tagged_cut.mp4" --start 0.5 --end 1.5
+check "untagged mp4 trims" "$qnedit" --quiet trim "$mp4media/avc_aac.mp4" "$work/plain_cut.mp4" --start 0.5 --end 1.5
+have ffmpeg && check "same frames with or without tags" bash -c "
+  cmp <(ffmpeg -v error -i '$work/tagged_cut.mp4' -f framemd5 - | grep -v '^#') <(ffmpeg -v error -i '$work/plain_cut.mp4' -f framemd5 - | grep -v '^#')"
+
 echo "$pass passed, $fail failed"
 [ "$fail" -eq 0 ]

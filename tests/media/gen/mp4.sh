@@ -24,6 +24,10 @@ ff "${video[@]}" $(tone 44100) -t 2 \
    "$dir/avc_aac.mp4"
 # The same samples with the index first.
 ff -i "$dir/avc_aac.mp4" -map 0 -c copy -movflags +faststart "$dir/avc_aac_faststart.mp4"
+# The same samples after a tagging tool: its metadata in front, the index
+# moved ahead of the media with padding between.
+AtomicParsley "$dir/avc_aac.mp4" --artist "Field Recorder" --title "Harbour at dawn" \
+  --comment "tagged by a tagging tool" -o "$dir/avc_aac_tagged.mp4" >/dev/null
 # And in a QuickTime file, whose sound description keeps the esds in a 'wave' box.
 ff -i "$dir/avc_aac.mp4" -map 0 -c copy -f mov "$dir/avc_aac.mov"
 

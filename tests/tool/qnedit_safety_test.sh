@@ -159,8 +159,8 @@ else
 fi
 
 # A signal in the middle of a long trim removes the temporary and exits 128+N.
-sox -n -r 48000 -c 2 -b 16 "$d/long.wav" synth 600 sine 440 2>/dev/null ||
-  ffmpeg -v error -f lavfi -i sine=frequency=440:sample_rate=48000 -ac 2 -t 600 "$d/long.wav"
+sox -n -r 48000 -c 2 -b 16 "$d/long.wav" synth 180 sine 440 2>/dev/null ||
+  ffmpeg -v error -f lavfi -i sine=frequency=440:sample_rate=48000 -ac 2 -t 180 "$d/long.wav"
 interrupt() {  # interrupt SIGNAL WANT_STATUS
   set -m  # background jobs get their own group and keep SIGINT
   "$qnedit" --quiet trim "$d/long.wav" "$d/long.flac" --start 0 2>"$work/sig.txt" &

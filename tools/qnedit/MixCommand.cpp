@@ -51,7 +51,7 @@ struct PcmTrack {
 
     // How long `bytes` of this PCM last.
     int64_t durationUs(size_t bytes) const {
-        return static_cast<int64_t>(bytes / (channels * (bits / 8))) * 1000000 / sampleRate;
+        return pcmDurationUs(bytes, channels * (bits / 8), sampleRate);
     }
 };
 

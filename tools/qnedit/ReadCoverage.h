@@ -49,6 +49,11 @@ private:
     std::string mCause;
 };
 
+// How long `bytes` of PCM with `frameBytes` per sample frame last.
+inline int64_t pcmDurationUs(size_t bytes, int frameBytes, int sampleRate) {
+    return static_cast<int64_t>(bytes / frameBytes) * 1000000 / sampleRate;
+}
+
 }  // namespace qnedit
 
 #endif

@@ -50,6 +50,8 @@ const char* const kTrimHelp =
 
 namespace {
 
+const char* const kVariableBlockSize = ": this FLAC stream has a variable block size and cannot be trimmed losslessly";
+
 struct Plan {
     std::string format;
     int muxFormat;
@@ -211,7 +213,7 @@ int runTrim(const std::vector<std::string>& words) {
         if (mime == MEDIA_MIMETYPE_AUDIO_FLAC) {
             int32_t trim = 0;
             if (!format->findInt32("editor-flactrim", &trim) || !trim) {
-                inputError(inPath + ": this FLAC stream has a variable block size and cannot be trimmed losslessly");
+                inputError(inPath + kVariableBlockSize);
             }
             t.flac = new QNMediaFlacFrameConverter(format);
             t.frameUs = flacFrameUs(format);
@@ -284,7 +286,7 @@ int runTrim(const std::vector<std::string>& words) {
             coverage.fail(timeUs, describeStatus(err));
             break;
         }
-        if (t.pcm) coverage.reached(source, timeUs + int64_t(buffer->size() / t.frameBytes) * 1000000 / t.sampleRate);
+        if (t.pcm) coverage.reached(source, timeUs + pcmDurationUs(buffer->size(), t.frameBytes, t.sampleRate));
         if (t.frameUs > 0) coverage.reached(source, timeUs + t.frameUs);
         uint32_t flags = 0;
         int32_t sync = 0;
@@ -296,7 +298,7 @@ int runTrim(const std::vector<std::string>& words) {
             // A stream numbered by samples (blocking bit set) may still have one
             // block size throughout; renumbering its frames would corrupt it.
             if (buffer->size() >= 2 && (buffer->data()[1] & 0x01) != 0) {
-                inputError(inPath + ": this FLAC stream has a variable block size and cannot be trimmed losslessly");
+                inputError(inPath + kVariableBlockSize);
             }
             buffer->meta()->setInt64("timeUs", timeUs);
             sp<ABuffer> converted;

@@ -1,6 +1,8 @@
 #include <gtest/gtest.h>
 
 #include <atomic>
+#include <cstdio>
+#include <cstdlib>
 #include <chrono>
 #include <functional>
 #include <future>
@@ -44,7 +46,17 @@ public:
         for (auto& f : mResults) {
             if (f.wait_until(deadline) != std::future_status::ready) {
                 ADD_FAILURE() << "a consumer stayed blocked";
-                while (f.wait_for(10ms) != std::future_status::ready) unstick();
+                // A wake-up that is lost for good would hang the suite until
+                // ctest's timeout: give up on the stuck thread instead.
+                const auto giveUp = std::chrono::steady_clock::now() + 5s;
+                while (f.wait_for(10ms) != std::future_status::ready) {
+                    if (std::chrono::steady_clock::now() > giveUp) {
+                        fprintf(stderr, "a blocked consumer never returned, even after the end of stream\n");
+                        fflush(stderr);
+                        std::abort();
+                    }
+                    unstick();
+                }
             }
             out.push_back(f.get());
         }

@@ -5,6 +5,7 @@
 set -euo pipefail
 root=$(cd "$(dirname "$0")/.." && pwd)
 out="$root/tests/media"
+"$root/scripts/deps.sh" --gen
 mkdir -p "$out"
 for gen in "$root"/tests/media/gen/*.sh; do
   echo "== $(basename "$gen")"

@@ -1,6 +1,7 @@
 #define LOG_TAG "FLACExtractor"
 #include "flac/FLACExtractor.h"
 
+#include <algorithm>
 #include <cstring>
 
 #include <log/log.h>
@@ -19,13 +20,71 @@ namespace android {
 
 namespace {
 
+// The bytes of another source up to `size`: a tag after the last frame is
+// then not taken for the start of a frame.
+class HeadDataSource : public DataSource {
+public:
+    HeadDataSource(const sp<DataSource>& source, off64_t size) : mSource(source), mSize(size) {}
+    status_t initCheck() const override { return mSource->initCheck(); }
+    ssize_t readAt(off64_t offset, void* data, size_t size) override {
+        if (offset < 0 || offset >= mSize) return 0;
+        return mSource->readAt(offset, data, static_cast<size_t>(std::min<uint64_t>(size, mSize - offset)));
+    }
+    status_t getSize(off64_t* size) override {
+        *size = mSize;
+        return OK;
+    }
+
+private:
+    const sp<DataSource> mSource;
+    const off64_t mSize;
+};
+
+// The sample just past the last whole frame near the end of the file, or 0
+// when none is found. Only the tail is read: it is widened while it holds no
+// whole frame, which takes a damaged file.
+uint64_t StreamEndSample(const sp<DataSource>& source, const FLACMetadata& meta, off64_t fileSize) {
+    // An ID3v1 tag (128 bytes starting "TAG") may follow the frames.
+    uint8_t tag[3];
+    if (fileSize - meta.firstFrameOffset > 128 && source->readExactly(fileSize - 128, tag, sizeof(tag)) &&
+        memcmp(tag, "TAG", 3) == 0) {
+        fileSize -= 128;
+    }
+    FLACFrameScanner scanner(new HeadDataSource(source, fileSize), meta.streamInfo, meta.firstFrameOffset);
+    for (off64_t span = std::max<off64_t>(256 * 1024, 4 * off64_t(scanner.maxFrameSize()));; span *= 4) {
+        off64_t from = std::max(meta.firstFrameOffset, fileSize - span);
+        const off64_t start = from;
+        uint64_t end = 0;
+        FLACFrame frame;
+        while (scanner.findFrame(from, &frame) == OK) {
+            end = std::max<uint64_t>(end, frame.firstSample + frame.blockSize);
+            from = frame.offset + static_cast<off64_t>(frame.size);
+        }
+        if (end > 0 || start == meta.firstFrameOffset) return end;
+    }
+}
+
+// Samples and sync samples handed out (one per frame, each a sync sample),
+// and where the frames stop when the file ends early. Streams of one block
+// size are counted from STREAMINFO; others would need every frame read.
+void SetIndexFacts(MetaData* t, const FlacStreamInfo& info, uint64_t endSample) {
+    const uint64_t total = info.totalSamples != 0 ? info.totalSamples : endSample;
+    if (info.minBlockSize == info.maxBlockSize && info.maxBlockSize > 0) {
+        const int64_t frames = static_cast<int64_t>((total + info.maxBlockSize - 1) / info.maxBlockSize);
+        t->setInt64(kKeySampleCount, frames);
+        t->setInt64(kKeySyncSampleCount, frames);
+    }
+    if (endSample < total) t->setInt64(kKeyTruncatedAtUs, TicksToUs(endSample, info.sampleRate));
+}
+
 int32_t PcmEncodingFor(uint32_t bits) {
     return bits == 16 ? kAudioEncodingPcm16bit : bits == 24 ? kAudioEncodingPcm24bitPacked : kAudioEncodingPcm32bit;
 }
 
 // What both output forms share.
-void SetCommonTrackMeta(MetaData* t, const FLACMetadata& meta, off64_t fileSize) {
+void SetCommonTrackMeta(MetaData* t, const FLACMetadata& meta, off64_t fileSize, uint64_t endSample) {
     const FlacStreamInfo& info = meta.streamInfo;
+    SetIndexFacts(t, info, endSample);
     t->setInt32(kKeySampleRate, static_cast<int32_t>(info.sampleRate));
     t->setInt32(kKeyChannelCount, static_cast<int32_t>(info.channels));
     t->setData(kKeyFlacStreamInfoRaw, 0, meta.streamInfoBlock, sizeof(meta.streamInfoBlock));
@@ -35,8 +94,10 @@ void SetCommonTrackMeta(MetaData* t, const FLACMetadata& meta, off64_t fileSize)
     memcpy(header + 4, meta.streamInfoBlock, sizeof(meta.streamInfoBlock));
     header[4] |= 0x80;
     t->setData(kKeyFlacMetadata, 0, header, sizeof(header));
-    if (info.totalSamples != 0) {
-        const int64_t durationUs = TicksToUs(info.totalSamples, info.sampleRate);
+    // Without a total in STREAMINFO the last frame gives the length.
+    const uint64_t total = info.totalSamples != 0 ? info.totalSamples : endSample;
+    if (total != 0) {
+        const int64_t durationUs = TicksToUs(total, info.sampleRate);
         t->setInt64(kKeyDuration, durationUs);
         if (durationUs > 0 && fileSize > meta.firstFrameOffset) {
             const int64_t bits = (fileSize - meta.firstFrameOffset) * 8;
@@ -66,8 +127,9 @@ FLACExtractor::FLACExtractor(const sp<DataSource>& source, const FLACMetadata& m
     off64_t fileSize;
     if (source->getSize(&fileSize) != OK) fileSize = -1;
     const FlacStreamInfo& info = meta.streamInfo;
+    const uint64_t endSample = fileSize > 0 ? StreamEndSample(source, meta, fileSize) : info.totalSamples;
 
-    SetCommonTrackMeta(mTrackMeta.get(), meta, fileSize);
+    SetCommonTrackMeta(mTrackMeta.get(), meta, fileSize, endSample);
     const uint32_t bits = FLACDecoder::OutputBits(info.bitsPerSample);
     mTrackMeta->setCString(kKeyMIMEType, MEDIA_MIMETYPE_AUDIO_RAW);
     mTrackMeta->setInt32(kKeyBitsPerSample, static_cast<int32_t>(bits));
@@ -75,7 +137,7 @@ FLACExtractor::FLACExtractor(const sp<DataSource>& source, const FLACMetadata& m
     mTrackMeta->setInt32(kKeyPcmEncoding, PcmEncodingFor(bits));
     mTrackMeta->setInt32(kKeyMaxInputSize, static_cast<int32_t>(info.maxBlockSize * info.channels * (bits / 8)));
 
-    SetCommonTrackMeta(mRawMeta.get(), meta, fileSize);
+    SetCommonTrackMeta(mRawMeta.get(), meta, fileSize, endSample);
     mRawMeta->setCString(kKeyMIMEType, MEDIA_MIMETYPE_AUDIO_FLAC);
     mRawMeta->setInt32(kKeyBitsPerSample, static_cast<int32_t>(info.bitsPerSample));
     FLACFrameScanner scanner(source, info, meta.firstFrameOffset);

@@ -114,7 +114,7 @@ status_t MPEG4Extractor::readFragments(const std::vector<std::pair<off64_t, mpeg
 status_t MPEG4Extractor::finishTracks() {
     int64_t durationUs = 0;
     for (const auto& track : mTracks) {
-        const status_t err = mpeg4::FinishTrack(mMovieTimescale, track.get());
+        const status_t err = mpeg4::FinishTrack(mMovieTimescale, uint64_t(mFileSize), track.get());
         if (err != OK) return err;
         int64_t trackUs;
         if (track->meta->findInt64(kKeyDuration, &trackUs)) durationUs = std::max(durationUs, trackUs);

@@ -119,6 +119,31 @@ status_t ReadSampleTables(const ByteReader& stbl, SampleTable* table) {
 
 int32_t ClampToInt32(uint64_t v) { return v > INT32_MAX ? INT32_MAX : static_cast<int32_t>(v); }
 
+// Counts what the source will hand out, in play order, and finds the first
+// sample whose bytes lie past the end of the file: from the index alone, so
+// that a probe need not read the media data.
+void SetIndexFacts(uint64_t fileSize, Track* track) {
+    const SampleTable& table = track->table;
+    int64_t samples = 0, syncs = 0;
+    SampleCursor cursor(table);
+    bool truncated = false;
+    for (const Segment& seg : track->segments) {
+        samples += seg.end - seg.begin;
+        syncs += table.syncPositionFrom(seg.end) - table.syncPositionFrom(seg.begin);
+        if (truncated) continue;
+        for (cursor.seek(seg.begin); cursor.valid() && cursor.index() < seg.end; cursor.advance()) {
+            const SampleInfo& s = cursor.info();
+            if (s.offset > fileSize || s.size > fileSize - s.offset) {
+                track->meta->setInt64(kKeyTruncatedAtUs, std::max<int64_t>(0, track->decodingUs(s, seg)));
+                truncated = true;
+                break;
+            }
+        }
+    }
+    track->meta->setInt64(kKeySampleCount, samples);
+    track->meta->setInt64(kKeySyncSampleCount, syncs);
+}
+
 }  // namespace
 
 int64_t SignedTicksToUs(int64_t ticks, uint32_t timescale) {
@@ -177,7 +202,7 @@ status_t ParseTrack(const ByteReader& trak, Track* track) {
     return OK;
 }
 
-status_t FinishTrack(uint32_t movieTimescale, Track* track) {
+status_t FinishTrack(uint32_t movieTimescale, uint64_t fileSize, Track* track) {
     const SampleTable& table = track->table;
     if (table.maxSampleSize() > kMaxSampleSize) return Malformed("sample larger than 64 MB");
     EditLayout layout;
@@ -197,6 +222,7 @@ status_t FinishTrack(uint32_t movieTimescale, Track* track) {
     }
     MetaData* meta = track->meta.get();
     meta->setInt64(kKeyDuration, durationUs);
+    SetIndexFacts(fileSize, track);
 
     // A start code is 4 bytes, so shorter length prefixes grow the sample.
     uint64_t maxInput = table.maxSampleSize();

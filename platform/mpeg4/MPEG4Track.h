@@ -50,9 +50,10 @@ struct Track {
 status_t ParseTrack(const ByteReader& trak, Track* track);
 
 // Once fragments have added their samples: lays out the edits and sets the
-// metadata that depends on the samples. ERROR_UNSUPPORTED for edits that are
-// not played at rate 1.
-status_t FinishTrack(uint32_t movieTimescale, Track* track);
+// metadata that depends on the samples, the counts of samples and sync samples
+// played and, in a file cut short at `fileSize`, where the track's data stops.
+// ERROR_UNSUPPORTED for edits that are not played at rate 1.
+status_t FinishTrack(uint32_t movieTimescale, uint64_t fileSize, Track* track);
 
 }  // namespace mpeg4
 }  // namespace android

@@ -37,7 +37,13 @@ WAVExtractor::WAVExtractor(const sp<DataSource>& source, const WAVInfo& info)
     t->setInt32(kKeyDeviceBitsPerSample, info.bitsPerSample);
     t->setInt32(kKeyPcmEncoding, WAVPcmEncoding(info));
     const uint32_t outFrame = info.outputFrameSize();
-    t->setInt32(kKeyMaxInputSize, static_cast<int32_t>(WAVSource::FramesPerSample(outFrame) * outFrame));
+    const uint32_t perSample = WAVSource::FramesPerSample(outFrame);
+    t->setInt32(kKeyMaxInputSize, static_cast<int32_t>(perSample * outFrame));
+    // Every buffer is a sync sample; a data chunk cut short was already
+    // measured against the file.
+    const int64_t samples = static_cast<int64_t>((info.frameCount + perSample - 1) / perSample);
+    t->setInt64(kKeySampleCount, samples);
+    t->setInt64(kKeySyncSampleCount, samples);
     info.items.publishTrackItems(t);
 }
 

@@ -20,12 +20,18 @@ using namespace android::qnmediaeditor;
 namespace qnedit {
 
 const char* const kProbeHelp =
-    "usage: qnedit probe FILE [--json]\n"
+    "usage: qnedit probe FILE [--json] [--verify]\n"
     "\n"
     "Shows the container, duration and total bitrate, each track's format (codec,\n"
     "picture size after cropping, sample rate, channels, bits), its sample and\n"
     "sync-sample counts, and the device's items stored in the file.\n"
-    "  --json   a stable machine-readable form\n";
+    "\n"
+    "Counts come from the file's index where it has one (MP4, FLAC, WAVE) without\n"
+    "reading the media; a file cut short (an MP4 whose samples lie past its end, a\n"
+    "FLAC whose last frame is missing or incomplete) fails with where it stops.\n"
+    "Damage inside the media data is found by reading it: --verify.\n"
+    "  --json     a stable machine-readable form\n"
+    "  --verify   read (and for FLAC decode) every sample, counting what was read\n";
 
 namespace {
 
@@ -34,7 +40,8 @@ struct TrackFacts {
     int64_t durationUs = -1;
     int32_t bitrate = -1, width = 0, height = 0, displayWidth = 0, displayHeight = 0, rotation = 0;
     int32_t sampleRate = 0, channels = 0, bits = 0;
-    int64_t samples = 0, syncSamples = 0;
+    int64_t samples = -1, syncSamples = -1;
+    int64_t truncatedAtUs = -1;  // from the index: where the data stops short
     int32_t bookmarkSize = -1;
 };
 
@@ -69,8 +76,13 @@ void readCroppedSize(const sp<AMessage>& format, const std::string& mime, TrackF
     }
 }
 
-TrackFacts describeTrack(const sp<AMessage>& f) {
+TrackFacts describeTrack(const sp<AMessage>& f, const sp<MetaData>& index) {
     TrackFacts t;
+    if (index != nullptr) {
+        index->findInt64(kKeySampleCount, &t.samples);
+        index->findInt64(kKeySyncSampleCount, &t.syncSamples);
+        index->findInt64(kKeyTruncatedAtUs, &t.truncatedAtUs);
+    }
     t.mime = Input::mimeOf(f);
     t.codec = codecName(t.mime);
     f->findInt64("durationUs", &t.durationUs);
@@ -92,6 +104,7 @@ TrackFacts describeTrack(const sp<AMessage>& f) {
 // track whose samples stop early) goes into `coverage`.
 void countSamples(Input& in, std::vector<TrackFacts>* tracks, ReadCoverage* coverage) {
     QNMediaExtractorWrapper& w = in.wrapper();
+    for (TrackFacts& t : *tracks) t.samples = t.syncSamples = 0;
     for (size_t i = 0; i < in.trackCount(); ++i) w.selectTrack(i);
     const int64_t duration = in.durationUs();
     Progress progress("probe", duration > 0 ? duration : 1);
@@ -114,6 +127,25 @@ void countSamples(Input& in, std::vector<TrackFacts>* tracks, ReadCoverage* cove
     for (size_t i = 0; i < in.trackCount(); ++i) {
         int64_t trackUs = -1;
         if (in.trackFormat(i)->findInt64("durationUs", &trackUs) && trackUs > 0) coverage->expectReach(i, trackUs);
+    }
+}
+
+// True when every track's counts came from the index.
+bool indexed(const std::vector<TrackFacts>& tracks) {
+    for (const TrackFacts& t : tracks) {
+        if (t.samples < 0 || t.syncSamples < 0) return false;
+    }
+    return true;
+}
+
+// What the index shows of damage: the data of a track stopping short.
+void indexDamage(const std::vector<TrackFacts>& tracks, ReadCoverage* coverage) {
+    for (size_t i = 0; i < tracks.size(); ++i) {
+        const TrackFacts& t = tracks[i];
+        if (t.truncatedAtUs < 0) continue;
+        std::string cause = "the file ends inside track " + std::to_string(i);
+        if (t.durationUs > 0) cause += ", " + formatSeconds(t.durationUs) + " expected";
+        coverage->fail(t.truncatedAtUs, cause);
     }
 }
 
@@ -224,13 +256,19 @@ void printText(const Input& in, const std::vector<TrackFacts>& tracks, const Dev
 }  // namespace
 
 int runProbe(const std::vector<std::string>& words) {
-    Args args(words, {}, {"--json"});
-    args.expectPositional(1, "qnedit probe FILE [--json]");
+    Args args(words, {}, {"--json", "--verify"});
+    args.expectPositional(1, "qnedit probe FILE [--json] [--verify]");
     Input in(args.positional()[0]);
     std::vector<TrackFacts> tracks;
-    for (size_t i = 0; i < in.trackCount(); ++i) tracks.push_back(describeTrack(in.trackFormat(i)));
+    for (size_t i = 0; i < in.trackCount(); ++i) {
+        tracks.push_back(describeTrack(in.trackFormat(i), in.wrapper().getTrackMeta(i, 0)));
+    }
     ReadCoverage coverage;
-    countSamples(in, &tracks, &coverage);
+    if (args.has("--verify") || !indexed(tracks)) {
+        countSamples(in, &tracks, &coverage);
+    } else {
+        indexDamage(tracks, &coverage);
+    }
     int64_t bitrate = -1;
     if (!in.wrapper().getTotalBitrate(&bitrate)) bitrate = -1;
     const DeviceItems items = describeItems(in);

@@ -74,6 +74,10 @@ enum {
     kKey64BitFileOffset = 'fobt',     // int32
     kKey2ByteNalLength = '2NAL',      // int32
     kKeyIsUnreadable = 'unre',        // int32
+    // Facts a track's index gives without reading its samples.
+    kKeySampleCount = 'nSmp',         // int64: samples (buffers) the track's source hands out
+    kKeySyncSampleCount = 'nSyn',     // int64: the sync samples among them
+    kKeyTruncatedAtUs = 'trnT',       // int64, us: where the track's data runs past the end of the file
 };
 
 enum {

@@ -1,8 +1,5 @@
 #define LOG_TAG "LibavAudioDecoder"
-#include <cstdarg>
-#include <cstdio>
 #include <cstring>
-#include <mutex>
 #include <new>
 
 #include <log/log.h>
@@ -11,11 +8,11 @@
 
 #include "codec/AudioDecoder.h"
 #include "codec/CodecConfig.h"
+#include "codec/LibavLog.h"
 
 extern "C" {
 #include <libavcodec/avcodec.h>
 #include <libavutil/channel_layout.h>
-#include <libavutil/log.h>
 #include <libavutil/mem.h>
 #include <libavutil/samplefmt.h>
 }
@@ -49,17 +46,6 @@ bool SampleType(AVSampleFormat format, PcmSampleType* type) {
         case AV_SAMPLE_FMT_DBL: *type = PcmSampleType::kDouble; return true;
         default: return false;
     }
-}
-
-// The codec library's complaints go to our log, not to stderr.
-void ForwardLog(void*, int level, const char* format, va_list args) {
-    // Its warnings are about features it lacks; the errors say what failed.
-    if (level > AV_LOG_ERROR) return;
-    char line[256];
-    vsnprintf(line, sizeof(line), format, args);
-    const size_t n = strlen(line);
-    if (n > 0 && line[n - 1] == '\n') line[n - 1] = '\0';
-    ALOGW("codec: %s", line);
 }
 
 class LibavAudioDecoder : public AudioDecoder {
@@ -163,8 +149,7 @@ private:
 }  // namespace
 
 std::unique_ptr<AudioDecoder> AudioDecoder::Create(const MetaData& format) {
-    static std::once_flag logOnce;
-    std::call_once(logOnce, [] { av_log_set_callback(ForwardLog); });
+    RouteLibavLog();
     AudioCodecConfig config;
     if (!ReadAudioCodecConfig(format, &config)) return nullptr;
     std::unique_ptr<LibavAudioDecoder> decoder(new (std::nothrow) LibavAudioDecoder);

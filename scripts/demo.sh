@@ -23,8 +23,13 @@ if command -v flac >/dev/null; then
   step "The flac tool checks the trimmed stream" flac --test --silent "$out/voice_1.2-5.flac"
 fi
 step "The recording's waveform as a picture" "$qnedit" waveform "$samples/voice.flac" -o "$out/voice_waveform.png"
+step "The waveform of the same recording kept as AAC (M4A), decoded first" \
+  "$qnedit" waveform "$samples/voice.m4a" -o "$out/voice_m4a_waveform.png"
 step "Mix background music in, 6 dB down, starting after 0.5 s" \
   "$qnedit" mix "$samples/voice.flac" "$samples/music.wav" "$out/voice_with_music.wav" --bgm-gain -6 --offset 500
+step "MP3 music under the clip, repeated to its end: video copied, audio re-encoded as AAC" \
+  "$qnedit" mix "$samples/clip.mp4" "$samples/music.mp3" "$out/clip_with_music.mp4" --bgm-gain -9 --offset 0 --loop
+step "The clip with music" "$qnedit" probe "$out/clip_with_music.mp4"
 step "A decoded NV12 frame as an RGB 5:6:5 picture" \
   "$qnedit" frame "$samples/frame_320x240.nv12" --size 320x240 --format nv12 -o "$out/frame.png"
 

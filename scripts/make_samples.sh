@@ -25,6 +25,11 @@ rm -f "$out/voice.wav"
 # 6 s of background music: 22.05 kHz mono, so the mix must convert it.
 ff -f lavfi -i "aevalsrc=0.25*sin(2*PI*523*t)*abs(sin(2*PI*2*t)):s=22050:d=6" -c:a pcm_s16le -fflags +bitexact "$out/music.wav"
 
+# The recording as a phone keeps it (AAC in M4A), and the background music as
+# MP3, for the compressed-audio waveform and mix.
+ff -i "$out/voice.flac" -c:a aac -b:a 64k -fflags +bitexact "$out/voice.m4a"
+ff -i "$out/music.wav" -c:a libmp3lame -b:a 64k -fflags +bitexact "$out/music.mp3"
+
 # One 320x240 NV12 frame, as a decoder would hand it out.
 ff -f lavfi -i testsrc2=size=320x240:rate=1:duration=1 -frames:v 1 -pix_fmt nv12 -f rawvideo "$out/frame_320x240.nv12"
 ls -l "$out"

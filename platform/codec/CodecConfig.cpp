@@ -119,4 +119,39 @@ bool ReadAudioCodecConfig(const MetaData& format, AudioCodecConfig* config) {
     return ok;
 }
 
+VideoCodec VideoCodecForMime(const char* mime) {
+    if (mime == nullptr) return VideoCodec::kNone;
+    if (strcasecmp(mime, MEDIA_MIMETYPE_VIDEO_AVC) == 0) return VideoCodec::kAvc;
+    if (strcasecmp(mime, MEDIA_MIMETYPE_VIDEO_HEVC) == 0) return VideoCodec::kHevc;
+    return VideoCodec::kNone;
+}
+
+bool ReadVideoCodecConfig(const MetaData& format, VideoCodecConfig* config) {
+    const char* mime = nullptr;
+    format.findCString(kKeyMIMEType, &mime);
+    config->codec = VideoCodecForMime(mime);
+    if (config->codec == VideoCodec::kNone) {
+        ALOGW("no decoder for %s", mime != nullptr ? mime : "a track without a MIME type");
+        return false;
+    }
+    const uint8_t* record;
+    size_t size;
+    if (!FindBytes(format, config->codec == VideoCodec::kAvc ? kKeyAVCC : kKeyHVCC, &record, &size)) {
+        ALOGW("%s track without its decoder configuration record", mime);
+        return false;
+    }
+    // Track samples arrive with start codes, so the parameter sets go in
+    // that form too (ISO/IEC 14496-10 Annex B).
+    Bytes sps, pps;
+    const bool ok = config->codec == VideoCodec::kAvc ? avccToAnnexB(record, size, &sps, &pps)
+                                                      : hvccToAnnexB(record, size, &sps);
+    if (!ok) {
+        ALOGW("%s track with a malformed decoder configuration record", mime);
+        return false;
+    }
+    config->extradata = std::move(sps);
+    config->extradata.insert(config->extradata.end(), pps.begin(), pps.end());
+    return true;
+}
+
 }  // namespace android

@@ -24,6 +24,18 @@ AudioCodec AudioCodecForMime(const char* mime);
 // False (with a log line) when the format lacks or mangles what the codec needs.
 bool ReadAudioCodecConfig(const MetaData& format, AudioCodecConfig* config);
 
+enum class VideoCodec { kNone, kAvc, kHevc };
+
+// A video decoder is opened with the parameter sets of the track's avcC or
+// hvcC record (ISO/IEC 14496-15), behind start codes as the samples are.
+struct VideoCodecConfig {
+    VideoCodec codec = VideoCodec::kNone;
+    std::vector<uint8_t> extradata;
+};
+
+VideoCodec VideoCodecForMime(const char* mime);
+bool ReadVideoCodecConfig(const MetaData& format, VideoCodecConfig* config);
+
 }  // namespace android
 
 #endif

@@ -1,4 +1,6 @@
+#include <algorithm>
 #include <cerrno>
+#include <cstdio>
 #include <cstring>
 #include <fcntl.h>
 #include <sys/stat.h>
@@ -11,23 +13,32 @@
 
 #include "Cli.h"
 #include "Commands.h"
+#include "FramePicture.h"
+#include "FrameVideo.h"
 #include "Input.h"
+#include "Interrupt.h"
 #include "OutputFile.h"
 #include "Png.h"
-#include "QNMediaEditorColorUtils.h"
 
 using namespace android;
-using namespace android::qnmediaeditor;
 
 namespace qnedit {
 
 const char* const kFrameHelp =
-    "usage: qnedit frame IN.yuv --size WxH --format nv12|nv21|i420|yv12 [--stride N]\n"
+    "usage: qnedit frame IN.mp4 --at SEC [--track N] -o OUT.png\n"
+    "       qnedit frame IN.mp4 --count N [--track N] -o DIR/\n"
+    "       qnedit frame IN.yuv --size WxH --format nv12|nv21|i420|yv12 [--stride N]\n"
     "                   [--slice-height N] [--crop L,T,R,B] [--range limited|full]\n"
     "                   [--standard bt601|bt709|bt2020] -o OUT.png\n"
     "\n"
-    "Turns one decoded 4:2:0 frame into an RGB 5:6:5 picture through the colour\n"
-    "converter and saves it as PNG.\n"
+    "A video's picture at a time (H.264 or HEVC), cropped and turned as a player\n"
+    "shows it, or one decoded 4:2:0 frame from a raw file, made an RGB 5:6:5\n"
+    "picture by the colour converter and saved as PNG.\n"
+    "  --at SEC            the first picture shown at or after SEC\n"
+    "  --count N           N pictures spread evenly over the video, saved as\n"
+    "                      DIR/frame-001.png ... (the strip under a timeline)\n"
+    "  --track N           the video track (default: the first)\n"
+    "Raw frames:\n"
     "  --size WxH          the picture size\n"
     "  --format F          the frame's layout\n"
     "  --stride N          bytes from one luma row to the next (default: width)\n"
@@ -72,14 +83,68 @@ std::vector<uint8_t> readWhole(const std::string& path) {
     return bytes;
 }
 
-}  // namespace
+const std::vector<std::string> kRawOptions = {"--size", "--format", "--stride", "--slice-height", "--crop",
+                                              "--range", "--standard"};
+constexpr long kMaxCount = 1000;
 
-int runFrame(const std::vector<std::string>& words) {
-    Args args(words, {"--size", "--format", "--stride", "--slice-height", "--crop", "--range", "--standard", "-o",
-                      "--output"}, {});
-    args.expectPositional(1, "qnedit frame IN.yuv --size WxH --format F [...] -o OUT.png");
-    const std::string outPath = args.get("-o", args.get("--output"));
-    if (outPath.empty()) usageError("-o OUT.png is required");
+void writePicture(const RgbImage& image, const std::string& path, const std::string& inPath) {
+    OutputFile out(path, {inPath});
+    std::string error;
+    if (!writePng(out.fd(), image, &error)) inputError(path + ": " + error);
+    out.commit();
+}
+
+// DIR/frame-001.png ..., numbered as wide as the count needs.
+std::string stripName(const std::string& dir, long index, long count) {
+    const int digits = std::max<int>(3, int(std::to_string(count).size()));
+    char name[32];
+    snprintf(name, sizeof(name), "frame-%0*ld.png", digits, index + 1);
+    return dir + (dir.empty() || dir.back() == '/' ? "" : "/") + name;
+}
+
+int runVideoFrame(const Args& args, const std::string& inPath, const std::string& outPath) {
+    for (const std::string& option : kRawOptions) {
+        if (args.has(option)) usageError(option + " is for raw frames; a video file says its own layout");
+    }
+    if (args.has("--at") == args.has("--count")) usageError("give --at SEC or --count N");
+    const long track = args.getIntIn("--track", -1, 0, 1 << 20);
+    if (args.has("--at")) {
+        const int64_t atUs = parseSeconds(args.get("--at"), "--at");
+        checkOutputPath(outPath, {inPath});
+        VideoPictures video(inPath, track);
+        int64_t shownUs = 0;
+        const RgbImage image = video.at(atUs, &shownUs);
+        writePicture(image, outPath, inPath);
+        fprintf(stderr, "%dx%d picture at %s -> %s\n", image.width, image.height, formatSeconds(shownUs).c_str(),
+                outPath.c_str());
+        return kExitOk;
+    }
+    const long count = args.getIntIn("--count", 1, 1, kMaxCount);
+    struct stat st;
+    const bool exists = stat(outPath.c_str(), &st) == 0;
+    if (exists && !S_ISDIR(st.st_mode)) usageError("with --count, -o names a directory");
+    VideoPictures video(inPath, track);
+    if (!exists && mkdir(outPath.c_str(), 0777) != 0) {
+        inputError(outPath + ": cannot make the directory (" + systemCause(errno) + ")");
+    }
+    catchInterrupts();
+    for (long i = 0; i < count; ++i) {
+        checkInterrupted();
+        // Each picture starts its share of the video.
+        int64_t shownUs = 0;
+        const RgbImage image = video.at(video.durationUs() * i / count, &shownUs);
+        const std::string path = stripName(outPath, i, count);
+        writePicture(image, path, inPath);
+        if (!gCommon.quiet) fprintf(stderr, "%s -> %s\n", formatSeconds(shownUs).c_str(), path.c_str());
+    }
+    fprintf(stderr, "%ld pictures -> %s\n", count, outPath.c_str());
+    return kExitOk;
+}
+
+int runRawFrame(const Args& args, const std::string& inPath, const std::string& outPath) {
+    if (args.has("--at") || args.has("--count") || args.has("--track")) {
+        usageError("--at, --count and --track are for video files; a raw frame is one picture");
+    }
     if (!args.has("--size") || !args.has("--format")) usageError("--size and --format are required");
     int width, height;
     parseSize(args.get("--size"), &width, &height);
@@ -109,7 +174,6 @@ int runFrame(const std::vector<std::string>& words) {
     else if (standard == "bt2020") standardCode = ColorUtils::kColorStandardBT2020;
     else usageError("--standard takes bt601, bt709 or bt2020");
 
-    const std::string inPath = args.positional()[0];
     const std::vector<uint8_t> frame = readWhole(inPath);
     // A 4:2:0 frame: the luma plane and two quarter-size chroma planes.
     const uint64_t need = uint64_t(stride) * uint64_t(sliceHeight) +
@@ -130,19 +194,24 @@ int runFrame(const std::vector<std::string>& words) {
     format->setInt32("color-standard", standardCode);
     format->setInt32("color-transfer", ColorUtils::kColorTransferSMPTE_170M);
 
-    sp<QNMediaEditorColorUtils> colors = new QNMediaEditorColorUtils();
-    colors->setOutputFormat(format);
-    const int outW = right - left + 1, outH = bottom - top + 1;
-    std::vector<uint8_t> rgb(size_t(outW) * outH * 2);
-    const status_t err = colors->convert(frame.data(), rgb.data());
-    if (err != OK) inputError(inPath + ": the colour converter refused the frame (" + describeStatus(err) + ")");
-
-    OutputFile out(outPath, {inPath});
-    std::string error;
-    if (!writePng(out.fd(), rgb565ToImage(rgb.data(), outW, outH), &error)) inputError(outPath + ": " + error);
-    out.commit();
-    fprintf(stderr, "%dx%d RGB 5:6:5 -> %s\n", outW, outH, outPath.c_str());
+    const RgbImage image = framePicture(format, frame.data(), 0, inPath);
+    writePicture(image, outPath, inPath);
+    fprintf(stderr, "%dx%d RGB 5:6:5 -> %s\n", image.width, image.height, outPath.c_str());
     return kExitOk;
+}
+
+}  // namespace
+
+int runFrame(const std::vector<std::string>& words) {
+    std::vector<std::string> valued = kRawOptions;
+    valued.insert(valued.end(), {"--at", "--count", "--track", "-o", "--output"});
+    Args args(words, valued, {});
+    args.expectPositional(1, "qnedit frame IN.mp4 --at SEC -o OUT.png (or IN.yuv --size WxH --format F -o OUT.png)");
+    const std::string outPath = args.get("-o", args.get("--output"));
+    if (outPath.empty()) usageError("-o is required");
+    const std::string inPath = args.positional()[0];
+    const bool raw = args.has("--size") || args.has("--format");
+    return raw ? runRawFrame(args, inPath, outPath) : runVideoFrame(args, inPath, outPath);
 }
 
 }  // namespace qnedit

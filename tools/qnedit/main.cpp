@@ -20,7 +20,7 @@ const Command kCommands[] = {
     {"trim", "cut a file losslessly", kTrimHelp, runTrim},
     {"waveform", "show, save or draw a recording's waveform", kWaveformHelp, runWaveform},
     {"mix", "mix background audio into a recording", kMixHelp, runMix},
-    {"frame", "turn one decoded YUV frame into a picture", kFrameHelp, runFrame},
+    {"frame", "save a video's picture, a strip of them, or a raw frame as PNG", kFrameHelp, runFrame},
 };
 
 void printUsage(FILE* out) {

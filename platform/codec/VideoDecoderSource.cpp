@@ -14,6 +14,7 @@
 
 #include "codec/CodecConfig.h"
 #include "codec/VideoDecoder.h"
+#include "mpeg4/MPEG4Source.h"
 
 namespace android {
 
@@ -25,6 +26,9 @@ constexpr int64_t kNoTime = std::numeric_limits<int64_t>::min();
 // growing.
 constexpr size_t kMaxQueued = 16;
 constexpr size_t kMaxAwaited = 64;
+// A track refuses a broken sample and goes on to the next; one that refuses
+// this many in a row has nothing left to give.
+constexpr int kMaxRefusedInARow = 256;
 constexpr int32_t kUnsaid = 2;  // ISO/IEC 23001-8 "unspecified"
 
 // The primaries that go with a matrix, for streams that name only the
@@ -123,7 +127,8 @@ VideoDecoderSource::VideoDecoderSource(const sp<IMediaSource>& track, const sp<M
       mInputEnded(false),
       mStartUs(0),
       mNewestUs(kNoTime),
-      mLastOutUs(kNoTime) {}
+      mLastOutUs(kNoTime),
+      mRefusedInARow(0) {}
 
 VideoDecoderSource::~VideoDecoderSource() {
     if (mStarted) stop();
@@ -167,6 +172,7 @@ void VideoDecoderSource::seekTo(int64_t timeUs) {
     mInputEnded = false;
     mNewestUs = kNoTime;
     mLastOutUs = kNoTime;
+    mRefusedInARow = 0;
 }
 
 status_t VideoDecoderSource::read(MediaBufferBase** buffer, const ReadOptions* options) {
@@ -237,9 +243,14 @@ status_t VideoDecoderSource::fill(const ReadOptions* options) {
         if (err == ERROR_END_OF_STREAM) {
             mInputEnded = true;
             err = mDecoder->drain(&pictures);
+        } else if (err == ERROR_MALFORMED || err == MPEG4Source::kErrorCorruptNal) {
+            if (++mRefusedInARow > kMaxRefusedInARow) return err;
+            ALOGW("the track refuses a video sample (%d): skipped", err);
+            continue;
         } else if (err != OK) {
             return err;
         } else {
+            mRefusedInARow = 0;
             in->meta_data().findInt64(kKeyTime, &timeUs);
             if (timeUs >= mStartUs) {
                 mAwaited.insert(timeUs);

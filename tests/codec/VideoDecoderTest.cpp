@@ -216,7 +216,7 @@ TEST(VideoDecoderSource, FormatCarriesLayoutCropAndColour) {
 // Hands out a track's samples, damaging every fifth from the third on (or all).
 class DamagedVideo : public MediaSource {
 public:
-    enum Damage { kBadLength, kTruncate, kGarbage, kAllGarbage };
+    enum Damage { kBadLength, kTruncate, kGarbage, kAllGarbage, kRefused };
     DamagedVideo(const sp<IMediaSource>& track, Damage damage) : mTrack(track), mDamage(damage) {}
     status_t start(MetaData* params) override { return mTrack->start(params); }
     status_t stop() override { return mTrack->stop(); }
@@ -224,15 +224,23 @@ public:
     status_t read(MediaBufferBase** buffer, const ReadOptions* options) override {
         const status_t err = mTrack->read(buffer, options);
         if (err != OK || (mDamage != kAllGarbage && (++mCount < 3 || mCount % 5 != 3))) return err;
+        ++damaged;
+        if (mDamage == kRefused) {  // as the MP4 track answers a sample whose units overrun it
+            (*buffer)->release();
+            *buffer = nullptr;
+            return ERROR_MALFORMED;
+        }
         uint8_t* p = static_cast<uint8_t*>((*buffer)->data()) + (*buffer)->range_offset();
         const size_t n = (*buffer)->range_length();
         switch (mDamage) {
             case kBadLength: memset(p, 0xFF, std::min<size_t>(n, 4)); break;  // a unit longer than the sample
             case kTruncate: (*buffer)->set_range((*buffer)->range_offset(), n / 3); break;
-            case kGarbage: case kAllGarbage: for (size_t i = 0; i < n; ++i) p[i] = uint8_t(i * 151 + mCount); break;
+            default: for (size_t i = 0; i < n; ++i) p[i] = uint8_t(i * 151 + mCount); break;
         }
         return OK;
     }
+
+    size_t damaged = 0;
 
 private:
     const sp<IMediaSource> mTrack;
@@ -245,17 +253,23 @@ TEST(VideoDecoderSource, DamagedSamplesAreSkippedOrHeld) {
     for (const char* file : {"avc_bpyramid.mp4", "hevc_main10.mp4"}) {
         const size_t samples = SampleCount(file);
         for (auto damage : {DamagedVideo::kBadLength, DamagedVideo::kTruncate, DamagedVideo::kGarbage,
-                            DamagedVideo::kAllGarbage}) {
+                            DamagedVideo::kAllGarbage, DamagedVideo::kRefused}) {
             SCOPED_TRACE(std::string(file) + " damage " + std::to_string(damage));
-            const Decoded run = DecodeAll(new DamagedVideo(VideoTrack(file), damage));
+            sp<DamagedVideo> damaged = new DamagedVideo(VideoTrack(file), damage);
+            const Decoded run = DecodeAll(damaged);
             EXPECT_EQ(run.status, ERROR_END_OF_STREAM);
             for (size_t i = 1; i < run.timesUs.size(); ++i) EXPECT_GT(run.timesUs[i], run.timesUs[i - 1]);
             // A damaged sample's place is held by the picture before it; with
-            // no picture at all there is nothing to hold.
-            EXPECT_EQ(run.timesUs.size(), damage == DamagedVideo::kAllGarbage ? 0 : samples);
+            // no picture at all there is nothing to hold, and a refused one
+            // has no time to hold a picture at.
+            const size_t expected = damage == DamagedVideo::kAllGarbage ? 0
+                                    : damage == DamagedVideo::kRefused  ? samples - damaged->damaged
+                                                                        : samples;
+            EXPECT_EQ(run.timesUs.size(), expected);
         }
     }
     EXPECT_TRUE(log.containsAt(ANDROID_LOG_WARN, "the picture before is held"));
+    EXPECT_TRUE(log.containsAt(ANDROID_LOG_WARN, "the track refuses a video sample"));
 }
 
 TEST(PictureConvert, DeepAndFullChromaBecome8Bit420) {

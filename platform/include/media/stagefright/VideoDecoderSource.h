@@ -33,7 +33,8 @@ struct VideoPicture;
 // A seek decodes from the sync sample at or before the time and hands out
 // the first picture presented at or after it. A compressed sample that gives
 // no picture (the codec rejects it, or drops what it cannot conceal) is
-// logged, and the picture before it is held in its place.
+// logged, and the picture before it is held in its place; one the track
+// refuses (ERROR_MALFORMED, a broken NAL unit) is logged and skipped.
 class VideoDecoderSource : public MediaSource {
 public:
     struct Limits {
@@ -78,6 +79,7 @@ private:
     int64_t mStartUs;         // pictures before this are not handed out
     int64_t mNewestUs;        // latest picture the decoder gave
     int64_t mLastOutUs;       // the picture read() gave last
+    int mRefusedInARow;       // samples the track could not give
     std::deque<Entry> mQueue; // by presentation time
     std::set<int64_t> mAwaited;           // times of samples fed, no picture yet
     std::shared_ptr<VideoPicture> mLast;  // held in place of a missing picture

@@ -80,6 +80,9 @@ struct FLACWriter::Impl : public SingleSourceWriter::Format {
     status_t writeHeader(ByteSink& sink, const sp<MetaData>& format) override;
     status_t writeSample(ByteSink& sink, MediaBufferBase& buffer) override;
     status_t finish(ByteSink& sink) override;
+    // Copied frames come one per sample: unbuffered, a long cut made one
+    // write call per frame.
+    size_t writeBuffer() const override { return FdSink::kWriterBuffer; }
 
     status_t writeStreamHeader(ByteSink& sink, const FlacStreamHeader& header);
     // The waveform block (when there is one) and a PADDING block of

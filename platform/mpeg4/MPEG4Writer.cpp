@@ -19,12 +19,6 @@
 
 namespace android {
 
-namespace {
-// Samples are gathered into writes of this size: a long copy otherwise makes
-// one system call per sample.
-constexpr size_t kWriteBuffer = 1 << 20;
-}  // namespace
-
 struct MPEG4Writer::Impl {
     Impl(int fd, FileBrand brand)
         : fd(fd), m4a(brand == FileBrand::kM4a), sharedItems(m4a ? "QNM4AWriter" : "MPEG4Writer") {}
@@ -93,7 +87,7 @@ status_t MPEG4Writer::Impl::start(MetaData* params) {
         result = err;
         return err;
     };
-    sink = new FdSink(fd, kWriteBuffer);
+    sink = new FdSink(fd, FdSink::kWriterBuffer);
     if (sink->initCheck() != OK) {
         ALOGE("no file descriptor to write to");
         return fail(BAD_VALUE);
@@ -155,7 +149,7 @@ void MPEG4Writer::Impl::readLoop(size_t index) {
             // producer is never left blocked.
             if (ioError == OK) {
                 const int64_t offset = sink->position();
-                ioError = sink->write(sample.data, sample.size);
+                ioError = slot.track->store(*sink, sample);
                 if (ioError == OK) {
                     slot.track->record(sample, static_cast<uint64_t>(offset), lastWriter == index);
                     lastWriter = index;

@@ -31,10 +31,13 @@ bool Mp4IsLengthPrefixed(const uint8_t* data, size_t size, size_t lengthSize) {
     return true;
 }
 
+bool Mp4FitsLength(size_t size, size_t lengthSize) {
+    return size <= UINT32_MAX && (lengthSize >= 4 || size < (size_t(1) << (8 * lengthSize)));
+}
+
 bool Mp4AppendLengthPrefixed(const std::vector<NalSpan>& nals, size_t lengthSize, std::vector<uint8_t>* out) {
     for (const NalSpan& nal : nals) {
-        if (lengthSize < 4 && nal.size >= (size_t(1) << (8 * lengthSize))) return false;
-        if (nal.size > UINT32_MAX) return false;
+        if (!Mp4FitsLength(nal.size, lengthSize)) return false;
         for (size_t k = lengthSize; k > 0; --k) out->push_back(static_cast<uint8_t>(nal.size >> (8 * (k - 1))));
         out->insert(out->end(), nal.data, nal.data + nal.size);
     }

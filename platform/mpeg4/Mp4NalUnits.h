@@ -21,6 +21,9 @@ bool Mp4SplitAnnexB(const uint8_t* data, size_t size, std::vector<NalSpan>* nals
 // big-endian length of `lengthSize` bytes (1, 2 or 4).
 bool Mp4IsLengthPrefixed(const uint8_t* data, size_t size, size_t lengthSize);
 
+// Whether a unit of `size` bytes can be stored behind a `lengthSize`-byte length.
+bool Mp4FitsLength(size_t size, size_t lengthSize);
+
 // Appends the units, each behind a `lengthSize`-byte length. False when a
 // unit is too long for that length size.
 bool Mp4AppendLengthPrefixed(const std::vector<NalSpan>& nals, size_t lengthSize, std::vector<uint8_t>* out);

@@ -7,6 +7,8 @@
 #include <media/stagefright/MediaDefs.h>
 #include <media/stagefright/MediaErrors.h>
 
+#include <media/stagefright/ByteSink.h>
+
 #include "media/CodecSpecificData.h"
 #include "mpeg4/Mp4BoxWriter.h"
 #include "mpeg4/Mp4ConfigRecords.h"
@@ -160,22 +162,38 @@ void Mp4TrackWriter::takeConfigBuffer(const uint8_t* data, size_t size) {
     }
 }
 
-const uint8_t* Mp4TrackWriter::toLengthPrefixed(const uint8_t* data, size_t size, size_t* outSize) {
-    *outSize = size;
-    if (Mp4IsLengthPrefixed(data, size, mLengthSize)) return data;
+void Mp4TrackWriter::toLengthPrefixed(const uint8_t* data, size_t size, Sample* out) {
+    out->data = data;
+    out->size = size;
+    if (Mp4IsLengthPrefixed(data, size, mLengthSize)) return;
     if (!Mp4SplitAnnexB(data, size, &mNals)) {
         if (!mWarnedFraming) ALOGW("sample is neither Annex-B nor length-prefixed; stored as given");
         mWarnedFraming = true;
-        return data;
+        return;
     }
     if (mRecord.empty() && !mConfigFromBuffers) collectParameterSets(mNals);
-    mScratch.clear();
-    if (!Mp4AppendLengthPrefixed(mNals, mLengthSize, &mScratch)) {
-        ALOGE("NAL unit too long for %zu-byte lengths; sample stored as given", mLengthSize);
-        return data;
+    size_t stored = 0;
+    for (const NalSpan& nal : mNals) {
+        if (!Mp4FitsLength(nal.size, mLengthSize)) {
+            ALOGE("NAL unit too long for %zu-byte lengths; sample stored as given", mLengthSize);
+            return;
+        }
+        stored += mLengthSize + nal.size;
     }
-    *outSize = mScratch.size();
-    return mScratch.data();
+    out->nals = &mNals;
+    out->size = stored;
+}
+
+status_t Mp4TrackWriter::store(ByteSink& sink, const Sample& s) const {
+    if (s.nals == nullptr) return sink.write(s.data, s.size);
+    for (const NalSpan& nal : *s.nals) {
+        uint8_t length[4];
+        for (size_t k = 0; k < mLengthSize; ++k) length[k] = static_cast<uint8_t>(nal.size >> (8 * (mLengthSize - 1 - k)));
+        status_t err = sink.write(length, mLengthSize);
+        if (err == OK) err = sink.write(nal.data, nal.size);
+        if (err != OK) return err;
+    }
+    return OK;
 }
 
 bool Mp4TrackWriter::prepare(MediaBufferBase* buffer, Sample* out) {
@@ -198,7 +216,7 @@ bool Mp4TrackWriter::prepare(MediaBufferBase* buffer, Sample* out) {
     if (!meta.findInt64(kKeyDecodingTime, &out->dtsUs)) out->dtsUs = out->ptsUs;
     out->sync = meta.findInt32(kKeyIsSyncFrame, &flag) && flag;
     if (isVideo()) {
-        out->data = toLengthPrefixed(data, size, &out->size);
+        toLengthPrefixed(data, size, out);
     } else {
         out->data = data;
         out->size = size;

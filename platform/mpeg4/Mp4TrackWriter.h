@@ -15,6 +15,7 @@
 
 namespace android {
 
+class ByteSink;
 class Mp4BoxWriter;
 
 // One track of the file: turns the buffers of its source into stored
@@ -34,7 +35,10 @@ public:
     Codec codec() const { return mCodec; }
 
     struct Sample {
+        // Stored as given, unless `nals` is set: then the units, each behind
+        // its length, make up the `size` bytes.
         const uint8_t* data = nullptr;
+        const std::vector<NalSpan>* nals = nullptr;
         size_t size = 0;
         int64_t dtsUs = 0;
         int64_t ptsUs = 0;
@@ -44,6 +48,9 @@ public:
     // (codec configuration, no bytes, no time). The bytes stay valid until
     // the next call or until the buffer is released.
     bool prepare(MediaBufferBase* buffer, Sample* out);
+    // Appends the sample's stored bytes: Annex-B units go to the sink behind
+    // their lengths without an intermediate copy.
+    status_t store(ByteSink& sink, const Sample& sample) const;
     void record(const Sample& sample, uint64_t offset, bool continuesChunk);
 
     size_t sampleCount() const { return mTables.sampleCount(); }
@@ -59,7 +66,7 @@ private:
 
     void takeConfigBuffer(const uint8_t* data, size_t size);
     void collectParameterSets(const std::vector<NalSpan>& nals);
-    const uint8_t* toLengthPrefixed(const uint8_t* data, size_t size, size_t* outSize);
+    void toLengthPrefixed(const uint8_t* data, size_t size, Sample* out);
     std::vector<uint8_t> buildConfig() const;
     void writeSampleEntry(Mp4BoxWriter& w) const;
     int64_t defaultDurationUs() const;
@@ -81,7 +88,6 @@ private:
     bool mWarnedFraming = false;
 
     std::vector<NalSpan> mNals;
-    std::vector<uint8_t> mScratch;
 
     Mp4TrackTables mTables;
     Mp4TrackTiming mTiming;

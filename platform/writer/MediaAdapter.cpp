@@ -1,13 +1,18 @@
 #define LOG_TAG "MediaAdapter"
 #include <media/stagefright/MediaAdapter.h>
 
+#include <algorithm>
+
 #include <log/log.h>
 #include <media/stagefright/MediaErrors.h>
 
 namespace android {
 
 MediaAdapter::MediaAdapter(const sp<MetaData>& meta, size_t maxQueued)
-    : mOutputFormat(meta), mMaxQueued(maxQueued ? maxQueued : 1) {}
+    : mOutputFormat(meta),
+      mMaxQueued(maxQueued ? maxQueued : 1),
+      mWakeReaderAt(std::max<size_t>(1, mMaxQueued / 4)),
+      mWakePusherAt(mMaxQueued / 2) {}
 
 MediaAdapter::~MediaAdapter() {
     for (MediaBuffer* buffer : mQueue) giveBack(buffer);
@@ -46,13 +51,16 @@ status_t MediaAdapter::read(MediaBufferBase** buffer, const ReadOptions* options
     if (options == nullptr) return mStopped && mQueue.empty() ? status_t(ERROR_END_OF_STREAM) : status_t(WOULD_BLOCK);
     while (mQueue.empty() && !mStopped) {
         mReaderWaiting = true;
-        mReaderCond.wait(lock);
-        mReaderWaiting = false;
+        mReaderCond.wait(lock, [this] { return !mReaderWaiting || mStopped; });
     }
+    mReaderWaiting = false;
     if (mQueue.empty()) return ERROR_END_OF_STREAM;
     MediaBuffer* front = mQueue.front();
     mQueue.pop_front();
-    if (mPusherWaiting) mPusherCond.notify_one();
+    if (mPusherWaiting && mQueue.size() <= mWakePusherAt) {
+        mPusherWaiting = false;
+        mPusherCond.notify_all();
+    }
     lock.unlock();
     // The reader owns it now; release() without an observer frees it.
     front->setObserver(nullptr);
@@ -67,8 +75,7 @@ status_t MediaAdapter::pushBuffer(MediaBuffer* buffer) {
     std::unique_lock<std::mutex> lock(mLock);
     while (!mStopped && mQueue.size() >= mMaxQueued) {
         mPusherWaiting = true;
-        mPusherCond.wait(lock);
-        mPusherWaiting = false;
+        mPusherCond.wait(lock, [this] { return !mPusherWaiting || mStopped; });
     }
     if (mStopped) {
         lock.unlock();
@@ -77,7 +84,10 @@ status_t MediaAdapter::pushBuffer(MediaBuffer* buffer) {
         return INVALID_OPERATION;
     }
     mQueue.push_back(buffer);
-    if (mReaderWaiting) mReaderCond.notify_one();
+    if (mReaderWaiting && mQueue.size() >= mWakeReaderAt) {
+        mReaderWaiting = false;
+        mReaderCond.notify_all();
+    }
     return OK;
 }
 

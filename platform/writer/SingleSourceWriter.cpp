@@ -84,7 +84,7 @@ status_t SingleSourceWriter::start() {
         if (err != OK) ALOGE("%s: source start failed (%d)", mName, err);
     }
     if (err == OK) {
-        mSink = new FdSink(mFd);
+        mSink = new FdSink(mFd, mFormat->writeBuffer());
         err = mFormat->writeHeader(*mSink, mSource->getFormat());
         if (err != OK) ALOGE("%s: writing the header failed (%d)", mName, err);
     }

@@ -36,6 +36,10 @@ public:
         virtual status_t writeSample(ByteSink& sink, MediaBufferBase& buffer) = 0;
         // In stop(), after the last buffer (only when writeHeader succeeded).
         virtual status_t finish(ByteSink& sink) = 0;
+        // Bytes of appends gathered into one write. 0 writes each sample as it
+        // comes, so that after a failed write finish() still describes every
+        // sample written before it; a format that gathers gives that up.
+        virtual size_t writeBuffer() const { return 0; }
     };
 
     // `name` is the log prefix; `format` must outlive this object. The

@@ -129,3 +129,28 @@ TEST(MediaAdapterConcurrencyTest, BuffersPushedBeforeStopAreAllDeliveredThenEndO
     EXPECT_EQ(INVALID_OPERATION, adapter->pushBuffer(late));
     EXPECT_EQ(ERROR_END_OF_STREAM, adapter->read(&buffer, nullptr));
 }
+
+TEST(MediaAdapterConcurrencyTest, AReaderWokenInBatchesStillGetsTheLastFewBuffersAtStop) {
+    // Fewer buffers than wake a waiting reader, and more than one batch.
+    for (int count : {3, 40}) {
+        sp<MediaAdapter> adapter = new MediaAdapter(new MetaData);
+        adapter->start();
+        int got = 0;
+        std::thread reader([&] {
+            MediaTrack::ReadOptions options;
+            MediaBufferBase* buffer;
+            while (adapter->read(&buffer, &options) == OK) {
+                ++got;
+                buffer->release();
+            }
+        });
+        for (int i = 0; i < count; ++i) {
+            MediaBuffer* b = new MediaBuffer(4);
+            b->add_ref();
+            ASSERT_EQ(OK, adapter->pushBuffer(b));
+        }
+        adapter->stop();
+        reader.join();
+        EXPECT_EQ(count, got);
+    }
+}

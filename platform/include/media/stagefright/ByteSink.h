@@ -48,6 +48,10 @@ protected:
 // goes is dropped (the caller may have closed or reused the descriptor).
 class FdSink : public ByteSink {
 public:
+    // What the writers gather appends into: a long copy otherwise makes one
+    // system call per sample.
+    static constexpr size_t kWriterBuffer = 1 << 20;
+
     explicit FdSink(int fd, size_t bufferBytes = 0);
     status_t initCheck() const { return mFd >= 0 ? OK : NO_INIT; }
     status_t write(const void* data, size_t size) override;

@@ -12,9 +12,12 @@
 namespace android {
 
 // Hands buffers pushed by one thread to a writer that reads them on another.
-// A bounded queue between the two: pushBuffer waits only while the queue is
-// full, and the reader is woken only when it is actually waiting, so a steady
-// stream costs no thread switch per sample.
+// A bounded queue between the two. Both sides are woken in batches, so that a
+// long copy costs a few thread switches per queue's worth of buffers instead of
+// one or two per sample: a waiting reader is woken once a quarter of the queue
+// has gathered (or at stop()), a pusher waiting on a full queue once it has
+// drained to half. A producer that pauses keeps up to a quarter of the queue
+// unwritten until it pushes more or stops the adapter.
 //
 // The writer reads with a ReadOptions object. A read without options comes
 // from outside the writer (the muxer's forced track stop): it never waits and
@@ -51,6 +54,8 @@ private:
     std::deque<MediaBuffer*> mQueue;
     sp<MetaData> mOutputFormat;
     const size_t mMaxQueued;
+    const size_t mWakeReaderAt;  // queued buffers that wake a waiting reader
+    const size_t mWakePusherAt;  // queued buffers that wake a waiting pusher
     bool mStarted = false;
     bool mStopped = false;
     bool mReaderWaiting = false;

@@ -1,10 +1,33 @@
 #include <media/stagefright/DataSource.h>
 
+#include <new>
+
+#include <log/log.h>
+#include <media/stagefright/MediaBuffer.h>
+#include <media/stagefright/MediaErrors.h>
+
 namespace android {
 
 status_t DataSource::getSize(off64_t* size) {
     *size = 0;
     return INVALID_OPERATION;
+}
+
+MediaBuffer* DataSource::readBuffer(off64_t offset, size_t size, status_t* err) {
+    MediaBuffer* buffer = new (std::nothrow) MediaBuffer(size);
+    if (buffer == nullptr || (size > 0 && buffer->data() == nullptr)) {
+        if (buffer != nullptr) buffer->release();
+        *err = NO_MEMORY;
+        return nullptr;
+    }
+    buffer->add_ref();
+    const ssize_t n = size > 0 ? readAt(offset, buffer->data(), size) : 0;
+    if (n != static_cast<ssize_t>(size)) {
+        buffer->release();
+        *err = n < 0 ? static_cast<status_t>(n) : ERROR_IO;
+        return nullptr;
+    }
+    return buffer;
 }
 
 bool DataSource::readExactly(off64_t offset, void* data, size_t size) {

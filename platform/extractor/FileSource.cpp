@@ -2,6 +2,8 @@
 #include <media/stagefright/FileSource.h>
 
 #include <algorithm>
+#include <iterator>
+#include <new>
 #include <cerrno>
 #include <cstring>
 #include <fcntl.h>
@@ -9,6 +11,7 @@
 #include <unistd.h>
 
 #include <log/log.h>
+#include <media/stagefright/MediaBuffer.h>
 #include <media/stagefright/MediaErrors.h>
 
 namespace android {
@@ -73,6 +76,76 @@ ssize_t FileSource::readAt(off64_t offset, void* data, size_t size) {
         done += static_cast<size_t>(n);
     }
     return static_cast<ssize_t>(done);
+}
+
+bool FileSource::Ahead::take(off64_t offset, size_t size) {
+    const off64_t end = offset + static_cast<off64_t>(size);
+    auto next = std::upper_bound(given.begin(), given.end(), std::make_pair(offset, INT64_MAX));
+    if (next != given.end() && next->first < end) return false;
+    if (next != given.begin() && std::prev(next)->second > offset) return false;
+    const bool joinsPrevious = next != given.begin() && std::prev(next)->second == offset;
+    const bool joinsNext = next != given.end() && next->first == end;
+    if (joinsPrevious && joinsNext) {
+        std::prev(next)->second = next->second;
+        given.erase(next);
+    } else if (joinsPrevious) {
+        std::prev(next)->second = end;
+    } else if (joinsNext) {
+        next->first = offset;
+    } else {
+        given.insert(next, {offset, end});
+    }
+    return true;
+}
+
+MediaBuffer* FileSource::readBuffer(off64_t offset, size_t size, status_t* err) {
+    // Ranges that fill much of a read gain nothing from sharing one.
+    if (mFd < 0 || offset < 0 || size == 0 || size > kReadAhead / 4) return DataSource::readBuffer(offset, size, err);
+    std::lock_guard<std::mutex> lock(mAheadLock);
+    Ahead* from = nullptr;
+    for (Ahead& a : mAhead) {
+        if (a.bytes != nullptr && offset >= a.start &&
+            static_cast<uint64_t>(offset - a.start) + size <= a.length && a.take(offset, size)) {
+            from = &a;
+            break;
+        }
+    }
+    if (from == nullptr) {
+        // Replaces the read used least recently.
+        from = &mAhead[0];
+        for (Ahead& a : mAhead) {
+            if (a.lastUse < from->lastUse) from = &a;
+        }
+        from->bytes.clear();
+        from->given.clear();
+        size_t want = kReadAhead;
+        if (mLength >= 0) want = static_cast<size_t>(std::max<int64_t>(0, std::min<int64_t>(want, mLength - offset)));
+        want = std::max(want, size);
+        sp<ABuffer> bytes = new (std::nothrow) ABuffer(want);
+        if (bytes == nullptr || bytes->base() == nullptr) {
+            *err = NO_MEMORY;
+            return nullptr;
+        }
+        const ssize_t n = readAt(offset, bytes->base(), want);
+        if (n < static_cast<ssize_t>(size)) {
+            *err = n < 0 ? static_cast<status_t>(n) : ERROR_IO;
+            return nullptr;
+        }
+        from->bytes = bytes;
+        from->start = offset;
+        from->length = static_cast<size_t>(n);
+        from->take(offset, size);
+    }
+    from->lastUse = ++mUses;
+    // The buffer takes the range as it is now and keeps the read alive.
+    from->bytes->setRange(static_cast<size_t>(offset - from->start), size);
+    MediaBuffer* out = new (std::nothrow) MediaBuffer(from->bytes);
+    if (out == nullptr) {
+        *err = NO_MEMORY;
+        return nullptr;
+    }
+    out->add_ref();
+    return out;
 }
 
 status_t FileSource::getSize(off64_t* size) {

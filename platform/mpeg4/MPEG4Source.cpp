@@ -29,8 +29,6 @@ status_t MPEG4Source::onStart() {
     return OK;
 }
 
-void MPEG4Source::onStop() { std::vector<uint8_t>().swap(mScratch); }
-
 void MPEG4Source::startSegment(size_t segment, uint32_t sample) {
     mSegment = segment;
     mCursor.seek(sample);
@@ -126,36 +124,40 @@ status_t MPEG4Source::readSample(const SampleInfo& sample, int64_t timeUs, Media
               sample.size);
         return ERROR_MALFORMED;
     }
-    // A 4-byte prefix turns into a start code in place; shorter ones grow
-    // the sample, which is then rebuilt from a scratch copy.
+    status_t err = OK;
+    MediaBuffer* out = mDataSource->readBuffer(static_cast<off64_t>(sample.offset), sample.size, &err);
+    if (out == nullptr) {
+        ALOGW("cannot read a sample of %u bytes at %llu (%d)", sample.size, (unsigned long long)sample.offset, err);
+        return err;
+    }
+    out->meta_data().setInt64(kKeyTime, timeUs);
     const size_t lengthSize = mTrack->nalLengthSize;
-    const bool inPlace = lengthSize == 0 || lengthSize == 4;
-    MediaBuffer* out = nullptr;
-    uint8_t* raw;
-    if (inPlace) {
-        if ((out = NewSampleBuffer(sample.size, timeUs)) == nullptr) return NO_MEMORY;
-        raw = static_cast<uint8_t*>(out->data());
-    } else {
-        mScratch.resize(sample.size);
-        raw = mScratch.data();
+    if (lengthSize == 0) {
+        *buffer = out;
+        return OK;
     }
-    const ssize_t n = sample.size > 0 ? mDataSource->readAt(sample.offset, raw, sample.size) : 0;
-    if (n != static_cast<ssize_t>(sample.size)) {
-        ALOGW("short read of a sample (%zd of %u bytes)", n, sample.size);
-        if (out != nullptr) out->release();
-        return n < 0 ? static_cast<status_t>(n) : ERROR_IO;
+    uint8_t* raw = static_cast<uint8_t*>(out->data());
+    size_t annexBSize;
+    if (!mpeg4::AnnexBSize(raw, sample.size, lengthSize, &annexBSize)) {
+        ALOGW("NAL unit length overruns a %u-byte sample", sample.size);
+        out->release();
+        return kErrorCorruptNal;
     }
-    if (lengthSize > 0) {
-        size_t annexBSize;
-        if (!mpeg4::AnnexBSize(raw, sample.size, lengthSize, &annexBSize)) {
-            ALOGW("NAL unit length overruns a %u-byte sample", sample.size);
-            if (out != nullptr) out->release();
-            return kErrorCorruptNal;
-        }
-        if (!inPlace && (out = NewSampleBuffer(annexBSize, timeUs)) == nullptr) return NO_MEMORY;
-        mpeg4::ToAnnexB(raw, sample.size, lengthSize, static_cast<uint8_t*>(out->data()));
+    if (lengthSize == 4) {
+        // A 4-byte prefix turns into a start code in place.
+        mpeg4::ToAnnexB(raw, sample.size, lengthSize, raw);
+        *buffer = out;
+        return OK;
     }
-    *buffer = out;
+    // Shorter prefixes grow the sample, which is rebuilt in a buffer of its own.
+    MediaBuffer* grown = NewSampleBuffer(annexBSize, timeUs);
+    if (grown == nullptr) {
+        out->release();
+        return NO_MEMORY;
+    }
+    mpeg4::ToAnnexB(raw, sample.size, lengthSize, static_cast<uint8_t*>(grown->data()));
+    out->release();
+    *buffer = grown;
     return OK;
 }
 

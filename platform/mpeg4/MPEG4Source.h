@@ -11,9 +11,10 @@
 
 namespace android {
 
-// The samples of one MP4 track, read from the file one at a time in the order
-// its edit list plays them: memory per read is the sample's size (twice that
-// when NAL prefixes shorter than a start code make the sample grow).
+// The samples of one MP4 track, read in the order its edit list plays them.
+// The data source shares its reads with the buffers it hands out, so memory
+// is the source's read-ahead plus what readers hold (twice a sample when NAL
+// prefixes shorter than a start code make it grow).
 class MPEG4Source : public TrackSource {
 public:
     // The media editor's status for a sample with a broken NAL unit; it skips
@@ -26,7 +27,6 @@ protected:
     ~MPEG4Source() override = default;
 
     status_t onStart() override;
-    void onStop() override;
     // SEEK_CLOSEST starts at the sync sample before the time and marks the
     // first buffer with kKeyTargetTime.
     status_t seekTo(int64_t timeUs, SeekMode mode) override;
@@ -48,7 +48,6 @@ private:
     size_t mSegment = 0;
     mpeg4::SampleCursor mCursor;
     int64_t mTargetTimeUs = -1;
-    std::vector<uint8_t> mScratch;
 };
 
 }  // namespace android

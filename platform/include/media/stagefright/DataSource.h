@@ -11,6 +11,8 @@
 
 namespace android {
 
+class MediaBuffer;
+
 // Random-access bytes that extractors read from.
 class DataSource : public RefBase {
 public:
@@ -30,6 +32,12 @@ public:
     virtual status_t getSize(off64_t* size);
     virtual uint32_t flags() { return 0; }
     virtual String8 toString() { return String8("<unspecified>"); }
+
+    // Exactly the bytes [offset, offset + size) in a buffer that holds one
+    // reference for the caller, who may rewrite them; null with *err set on
+    // a read error or a short read. Sources that read ahead hand out
+    // consecutive ranges from one read without copying them.
+    virtual MediaBuffer* readBuffer(off64_t offset, size_t size, status_t* err);
 
     // Reads exactly `size` bytes or answers false.
     bool readExactly(off64_t offset, void* data, size_t size);

@@ -2,6 +2,12 @@
 
 #include <cstring>
 
+#include <media/stagefright/foundation/CpuFeatures.h>
+
+#if ME_X86_KERNELS
+#include <immintrin.h>
+#endif
+
 namespace android {
 
 namespace {
@@ -101,11 +107,63 @@ uint16_t shiftCrc(uint16_t crc, uint64_t n) {
     return mulMod(crc, power);
 }
 
+// x^n mod P.
+constexpr uint16_t xPowMod(unsigned n) {
+    uint16_t r = 1;
+    for (unsigned i = 0; i < n; ++i) r = step16(r);
+    return r;
+}
+
+#if ME_X86_KERNELS
+// Carry-less multiplication folds 16 bytes at a time: a 128-bit block X of
+// the message, its first byte highest, counts as X(x) and is carried past
+// the next 128 bits as Xhi * (x^192 mod P) + Xlo * (x^128 mod P), a product
+// of at most 80 bits that stays congruent modulo P. The last fold is reduced
+// by the table: the table CRC of the 16 bytes of A is A(x) * x^16 mod P.
+constexpr uint64_t kFold192 = xPowMod(192);
+constexpr uint64_t kFold128 = xPowMod(128);
+
+bool cpuHasClmul() {
+    static const bool has = [] {
+        __builtin_cpu_init();
+        return __builtin_cpu_supports("pclmul") && __builtin_cpu_supports("ssse3");
+    }();
+    return has;
+}
+
+__attribute__((target("pclmul,ssse3"))) uint16_t folded(uint16_t crc, const uint8_t* p, size_t size) {
+    const __m128i reverse = _mm_set_epi8(0, 1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 11, 12, 13, 14, 15);
+    const __m128i fold = _mm_set_epi64x(static_cast<long long>(kFold192), static_cast<long long>(kFold128));
+    // The running CRC enters as the message's first two bytes: continuing
+    // from crc over M is the CRC from 0 over M with crc added to its start.
+    __m128i acc = _mm_shuffle_epi8(_mm_loadu_si128(reinterpret_cast<const __m128i*>(p)), reverse);
+    acc = _mm_xor_si128(acc, _mm_slli_si128(_mm_cvtsi32_si128(crc), 14));
+    p += 16;
+    size -= 16;
+    for (; size >= 16; size -= 16, p += 16) {
+        const __m128i next = _mm_shuffle_epi8(_mm_loadu_si128(reinterpret_cast<const __m128i*>(p)), reverse);
+        const __m128i hi = _mm_clmulepi64_si128(acc, fold, 0x11);
+        const __m128i lo = _mm_clmulepi64_si128(acc, fold, 0x00);
+        acc = _mm_xor_si128(_mm_xor_si128(hi, lo), next);
+    }
+    alignas(16) uint8_t last[16];
+    _mm_store_si128(reinterpret_cast<__m128i*>(last), _mm_shuffle_epi8(acc, reverse));
+    return sliced(sliced(0, last, 16), p, size);
+}
+#endif
+
 }  // namespace
 
 uint16_t FLACCrc16Update(uint16_t crc, uint8_t byte) { return byteStep(crc, byte); }
 
 uint16_t FLACCrc16Continue(uint16_t crc, const uint8_t* p, size_t size) {
+#if ME_X86_KERNELS
+    if (size >= 64 && cpuHasClmul()) return folded(crc, p, size);
+#endif
+    return FLACCrc16Table(crc, p, size);
+}
+
+uint16_t FLACCrc16Table(uint16_t crc, const uint8_t* p, size_t size) {
     // Two halves run as independent sums so that their look-ups overlap,
     // joined by crc(A B) = crc(A) * x^(8|B|) + crc(B) (no initial value or final XOR).
     const size_t half = (size / 2) & ~(kSlices - 1);

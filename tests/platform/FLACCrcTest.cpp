@@ -36,15 +36,18 @@ TEST(FLACCrcTest, FastSumsMatchTheReferenceBitForBit) {
         for (size_t offset = 0; offset < 16; ++offset) {
             for (size_t n : lengths) {
                 const uint8_t* p = bytes->data() + offset;
-                ASSERT_EQ(FLACCrc16Reference(p, n), FLACCrc16(p, n)) << offset << " " << n;
+                const uint16_t expected = FLACCrc16Reference(p, n);
+                ASSERT_EQ(expected, FLACCrc16(p, n)) << offset << " " << n;
+                ASSERT_EQ(expected, FLACCrc16Table(0, p, n)) << offset << " " << n;
                 if (n <= 300) ASSERT_EQ(FLACCrc8Reference(p, n), FLACCrc8(p, n)) << offset << " " << n;
             }
         }
     }
     // Continuing over any split, or byte by byte, gives the sum of the whole.
     const uint16_t whole = FLACCrc16Reference(random.data(), 5000);
-    for (size_t split : {0u, 1u, 15u, 16u, 17u, 130u, 2500u, 4999u, 5000u}) {
+    for (size_t split : {0u, 1u, 15u, 16u, 17u, 130u, 2500u, 4936u, 4999u, 5000u}) {
         EXPECT_EQ(whole, FLACCrc16Continue(FLACCrc16(random.data(), split), random.data() + split, 5000 - split));
+        EXPECT_EQ(whole, FLACCrc16Table(FLACCrc16Table(0, random.data(), split), random.data() + split, 5000 - split));
     }
     uint16_t stepped = 0;
     for (size_t i = 0; i < 5000; ++i) stepped = FLACCrc16Update(stepped, random[i]);

@@ -26,11 +26,14 @@ bool ReadTableHeader(ByteReader* r, uint32_t* count, uint64_t entryBytes) {
 }
 
 // Calls `each` with the fields of every entry of a table of kFields 32-bit
-// fields; `each` answers false for an entry that cannot be right.
-template <size_t kFields, typename Each>
-bool ForEachEntry(ByteReader r, Each each) {
+// fields; `each` answers false for an entry that cannot be right. `runs`
+// is sized for the entries up front: grown by doubling, it would hold up to
+// twice the table.
+template <size_t kFields, typename Run, typename Each>
+bool ForEachEntry(ByteReader r, std::vector<Run>* runs, Each each) {
     uint32_t count;
     if (!ReadTableHeader(&r, &count, 4 * kFields)) return false;
+    runs->reserve(runs->size() + count);
     for (uint32_t i = 0; i < count; ++i) {
         uint32_t fields[kFields] = {};
         for (uint32_t& f : fields) r.be32(&f);
@@ -78,7 +81,7 @@ status_t SampleTable::setChunkOffsets(uint32_t type, ByteReader r) {
 
 status_t SampleTable::setSampleToChunk(ByteReader r) {
     uint32_t previous = 0;
-    const bool ok = ForEachEntry<3>(r, [&](const uint32_t* e) {
+    const bool ok = ForEachEntry<3>(r, &mChunkRuns, [&](const uint32_t* e) {
         // First chunk numbers start at 1 and rise.
         if (e[0] <= previous) return false;
         previous = e[0];
@@ -91,7 +94,7 @@ status_t SampleTable::setSampleToChunk(ByteReader r) {
 }
 
 status_t SampleTable::setTimeToSample(ByteReader r) {
-    const bool ok = ForEachEntry<2>(r, [&](const uint32_t* e) {
+    const bool ok = ForEachEntry<2>(r, &mTimeRuns, [&](const uint32_t* e) {
         if (e[0] > 0) mTimeRuns.push_back({0, 0, e[0], e[1]});
         return true;
     });
@@ -103,7 +106,7 @@ status_t SampleTable::setTimeToSample(ByteReader r) {
 status_t SampleTable::setCompositionOffsets(ByteReader r) {
     // Version 0 declares the offsets unsigned, but writers store negative
     // ones there too; an offset of 2^31 ticks or more is never meant.
-    const bool ok = ForEachEntry<2>(r, [&](const uint32_t* e) {
+    const bool ok = ForEachEntry<2>(r, &mOffsetRuns, [&](const uint32_t* e) {
         if (e[0] > 0) mOffsetRuns.push_back({0, e[0], static_cast<int32_t>(e[1])});
         return true;
     });
@@ -111,7 +114,7 @@ status_t SampleTable::setCompositionOffsets(ByteReader r) {
 }
 
 status_t SampleTable::setSyncSamples(ByteReader r) {
-    const bool ok = ForEachEntry<1>(r, [&](const uint32_t* e) {
+    const bool ok = ForEachEntry<1>(r, &mSyncSamples, [&](const uint32_t* e) {
         if (e[0] > 0) mSyncSamples.push_back(e[0] - 1);
         return true;
     });
@@ -151,7 +154,7 @@ status_t SampleTable::indexTimes() {
     size_t kept = 0;
     for (; kept < mTimeRuns.size() && sample < mCount; ++kept) {
         TimeRun& run = mTimeRuns[kept];
-        run.firstSample = sample;
+        run.firstSample = static_cast<uint32_t>(sample);
         run.firstDts = dts;
         const uint64_t span = uint64_t(run.count) * run.delta;
         if (span > uint64_t(kMaxTicks - dts)) return Malformed("decoding times overflow");
@@ -181,7 +184,7 @@ status_t SampleTable::indexTimes() {
     kept = 0;
     for (; kept < mOffsetRuns.size() && sample < mCount; ++kept) {
         OffsetRun& run = mOffsetRuns[kept];
-        run.firstSample = sample;
+        run.firstSample = static_cast<uint32_t>(sample);
         sample += run.count;
         mMinCtsOffset = std::min(mMinCtsOffset, run.offset);
         mMaxCtsOffset = std::max(mMaxCtsOffset, run.offset);
@@ -191,21 +194,21 @@ status_t SampleTable::indexTimes() {
 }
 
 status_t SampleTable::indexChunks() {
-    std::vector<ChunkRun> kept;
-    kept.reserve(mChunkRuns.size());
+    // Runs are kept in place: the one written never passes the one read.
     uint64_t sample = 0;
+    size_t kept = 0;
     for (size_t i = 0; i < mChunkRuns.size() && sample < mCount; ++i) {
         ChunkRun run = mChunkRuns[i];
         if (run.firstChunk >= mChunkCount) break;
         run.chunkEnd = i + 1 < mChunkRuns.size() ? std::min(mChunkRuns[i + 1].firstChunk, mChunkCount)
                                                  : mChunkCount;
         if (run.samplesPerChunk == 0) continue;
-        run.firstSample = sample;
+        run.firstSample = static_cast<uint32_t>(sample);
         sample += uint64_t(run.chunkEnd - run.firstChunk) * run.samplesPerChunk;
-        kept.push_back(run);
+        mChunkRuns[kept++] = run;
     }
     if (sample < mCount) return Malformed("chunks hold fewer samples than the size table lists");
-    mChunkRuns.swap(kept);
+    mChunkRuns.resize(kept);
     return OK;
 }
 
@@ -307,7 +310,7 @@ void SampleTable::appendTimes(uint32_t first, int64_t dts, const std::vector<Fra
             last->firstDts + int64_t(uint64_t(last->count) * delta) == dts) {
             ++last->count;
         } else {
-            mTimeRuns.push_back({first + i, dts, 1, delta});
+            mTimeRuns.push_back({dts, static_cast<uint32_t>(first + i), 1, delta});
         }
         mLastDts = dts;
         dts += delta;
@@ -320,20 +323,22 @@ void SampleTable::appendOffsets(uint32_t first, const std::vector<FragmentSample
     if (!mOffsetRuns.empty()) {
         OffsetRun& last = mOffsetRuns.back();
         last.count = static_cast<uint32_t>(std::min<uint64_t>(last.count, first - last.firstSample));
-        covered = last.firstSample + last.count;
+        covered = uint64_t(last.firstSample) + last.count;
     }
     bool any = !mOffsetRuns.empty();
     for (const FragmentSample& s : samples) any = any || s.ctsOffset != 0;
     if (!any) return;
     // Samples the movie box's table leaves out have no offset.
-    if (covered < first) mOffsetRuns.push_back({covered, static_cast<uint32_t>(first - covered), 0});
+    if (covered < first) {
+        mOffsetRuns.push_back({static_cast<uint32_t>(covered), static_cast<uint32_t>(first - covered), 0});
+    }
     for (size_t i = 0; i < samples.size(); ++i) {
         const int32_t offset = samples[i].ctsOffset;
         OffsetRun* last = mOffsetRuns.empty() ? nullptr : &mOffsetRuns.back();
-        if (last != nullptr && last->offset == offset && last->firstSample + last->count == first + i) {
+        if (last != nullptr && last->offset == offset && uint64_t(last->firstSample) + last->count == first + i) {
             ++last->count;
         } else {
-            mOffsetRuns.push_back({first + i, 1, offset});
+            mOffsetRuns.push_back({static_cast<uint32_t>(first + i), 1, offset});
         }
         mMinCtsOffset = std::min(mMinCtsOffset, offset);
         mMaxCtsOffset = std::max(mMaxCtsOffset, offset);

@@ -74,20 +74,22 @@ public:
 private:
     friend class SampleCursor;
 
+    // Runs start below count(), so 32 bits hold their first sample; a run
+    // takes little more than the table entry it comes from.
     struct ChunkRun {
-        uint64_t firstSample;
+        uint32_t firstSample;
         uint32_t firstChunk;  // zero-based
         uint32_t chunkEnd;    // one past the run's last chunk
         uint32_t samplesPerChunk;
     };
     struct TimeRun {
-        uint64_t firstSample;
         int64_t firstDts;
+        uint32_t firstSample;
         uint32_t count;
         uint32_t delta;
     };
     struct OffsetRun {
-        uint64_t firstSample;
+        uint32_t firstSample;
         uint32_t count;
         int32_t offset;
     };

@@ -60,6 +60,13 @@ Input::Input(const std::string& path, bool flacRaw) : mPath(path) {
     struct stat st;
     if (fstat(mFd, &st) != 0) inputError(path + ": cannot open (" + systemCause(errno) + ")");
     mFileSize = st.st_size;
+    {
+        // The wrapper does not hand out the file metadata; the platform does.
+        // Its extractor goes before the wrapper's opens, so that the two
+        // indexes of a long file are never held at once.
+        sp<IMediaExtractor> extractor = MediaExtractorFactory::Create(new FileSource(mFd, 0, mFileSize));
+        if (extractor != nullptr) mPlatformMeta = extractor->getMetaData();
+    }
     mWrapper = new QNMediaExtractorWrapper();
     const status_t err = mWrapper->setDataSource(mFd, 0, mFileSize);
     if (err != OK) {
@@ -80,9 +87,6 @@ Input::Input(const std::string& path, bool flacRaw) : mPath(path) {
         mTrackFormats.push_back(format);
     }
     if (mTrackFormats.empty()) inputError(path + ": no tracks");
-    // The wrapper does not hand out the file metadata; the platform does.
-    sp<IMediaExtractor> extractor = MediaExtractorFactory::Create(new FileSource(mFd, 0, mFileSize));
-    if (extractor != nullptr) mPlatformMeta = extractor->getMetaData();
 }
 
 Input::~Input() {

@@ -81,7 +81,7 @@ private:
 // silence there, a read that fails ends the audio as damage.
 class DecodedPcm : public PcmReader {
 public:
-    DecodedPcm(const std::string& path, size_t track, int64_t durationUs) : mPath(path), mTrack(track) {
+    DecodedPcm(const std::string& path, size_t track, int64_t durationUs) : mTrack(track) {
         sp<IMediaExtractor> extractor = MediaExtractorFactory::Create(new FileSource(path.c_str()));
         if (extractor != nullptr && track < extractor->countTracks()) {
             mDecoder = AudioDecoderSource::Create(extractor->getTrack(track));
@@ -136,7 +136,6 @@ public:
     }
 
 private:
-    const std::string mPath;
     const size_t mTrack;
     sp<AudioDecoderSource> mDecoder;
     bool mStarted = false;

@@ -47,8 +47,8 @@ protected:
     ReadCoverage mCoverage;
 };
 
-// The audio track `track` of `path` (its first audio track when negative);
-// a usage of the tool's errors for what cannot be read or mixed.
+// The audio track `track` of `path` (its first audio track when negative).
+// A file that cannot be read or mixed ends the command with an input error.
 std::unique_ptr<PcmReader> openPcmReader(const std::string& path, long track = -1);
 
 }  // namespace qnedit

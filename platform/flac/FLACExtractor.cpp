@@ -40,10 +40,14 @@ private:
     const off64_t mSize;
 };
 
-// The sample just past the last whole frame near the end of the file, or 0
-// when none is found. Only the tail is read: it is widened while it holds no
-// whole frame, which takes a damaged file.
-uint64_t StreamEndSample(const sp<DataSource>& source, const FLACMetadata& meta, off64_t fileSize) {
+// Tails wider than this without one whole frame are not a cut-short FLAC
+// but something else after the frames: the end is left unknown.
+constexpr off64_t kMaxTailBytes = 16 * 1024 * 1024;
+
+// The sample just past the last whole frame near the end of the file (0 when
+// there is none). Only the tail is read: it is widened while it holds no
+// whole frame, which takes a damaged file. False when the end stays unknown.
+bool StreamEndSample(const sp<DataSource>& source, const FLACMetadata& meta, off64_t fileSize, uint64_t* endSample) {
     // An ID3v1 tag (128 bytes starting "TAG") may follow the frames.
     uint8_t tag[3];
     if (fileSize - meta.firstFrameOffset > 128 && source->readExactly(fileSize - 128, tag, sizeof(tag)) &&
@@ -51,16 +55,26 @@ uint64_t StreamEndSample(const sp<DataSource>& source, const FLACMetadata& meta,
         fileSize -= 128;
     }
     FLACFrameScanner scanner(new HeadDataSource(source, fileSize), meta.streamInfo, meta.firstFrameOffset);
+    const off64_t area = fileSize - meta.firstFrameOffset;
     for (off64_t span = std::max<off64_t>(256 * 1024, 4 * off64_t(scanner.maxFrameSize()));; span *= 4) {
-        off64_t from = std::max(meta.firstFrameOffset, fileSize - span);
-        const off64_t start = from;
+        const bool whole = span >= area;
+        off64_t from = whole ? meta.firstFrameOffset : fileSize - span;
+        bool found = false;
         uint64_t end = 0;
         FLACFrame frame;
         while (scanner.findFrame(from, &frame) == OK) {
+            found = true;
             end = std::max<uint64_t>(end, frame.firstSample + frame.blockSize);
             from = frame.offset + static_cast<off64_t>(frame.size);
         }
-        if (end > 0 || start == meta.firstFrameOffset) return end;
+        if (found || whole) {
+            *endSample = end;
+            return true;
+        }
+        if (span >= kMaxTailBytes) {
+            ALOGW("no whole frame in the last %lld bytes; where the stream ends is not known", (long long)span);
+            return false;
+        }
     }
 }
 
@@ -127,7 +141,8 @@ FLACExtractor::FLACExtractor(const sp<DataSource>& source, const FLACMetadata& m
     off64_t fileSize;
     if (source->getSize(&fileSize) != OK) fileSize = -1;
     const FlacStreamInfo& info = meta.streamInfo;
-    const uint64_t endSample = fileSize > 0 ? StreamEndSample(source, meta, fileSize) : info.totalSamples;
+    uint64_t endSample = info.totalSamples;  // taken as whole when its end is not known
+    if (fileSize > 0) StreamEndSample(source, meta, fileSize, &endSample);
 
     SetCommonTrackMeta(mTrackMeta.get(), meta, fileSize, endSample);
     const uint32_t bits = FLACDecoder::OutputBits(info.bitsPerSample);

@@ -135,6 +135,10 @@ TEST(IndexFactsTest, FlacEndIsFoundFromTheTail) {
     std::vector<uint8_t> noTotal = whole;
     noTotal[8 + 13] &= 0xF0;
     std::fill(noTotal.begin() + 8 + 14, noTotal.begin() + 8 + 18, 0);
+    // Past a bounded tail the end is not looked for: taken as whole.
+    std::vector<uint8_t> trailer = whole;
+    trailer.resize(whole.size() + 17 * 1024 * 1024);
+    const size_t firstFrame = static_cast<size_t>(FactInt("b4096.flac", "frame_offset"));
 
     const struct {
         const char* name;
@@ -146,6 +150,8 @@ TEST(IndexFactsTest, FlacEndIsFoundFromTheTail) {
         {"no total in STREAMINFO", noTotal, -1},
         {"cut inside the last frame", {whole.begin(), whole.end() - lastFrame / 2}, lastStartUs},
         {"cut before the last frame", {whole.begin(), whole.end() - lastFrame}, lastStartUs},
+        {"no whole frame", {whole.begin(), whole.begin() + firstFrame + 100}, 0},
+        {"a long trailer", trailer, -1},
     };
     for (const auto& c : kCases) {
         SCOPED_TRACE(c.name);

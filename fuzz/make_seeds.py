@@ -116,6 +116,10 @@ def main(media, out):
 
     for f in samples:
         write(out, "fuzz_extractor", os.path.basename(f), open(f, "rb").read())
+    # Decoder: whole small files, whose samples the decoders then read.
+    for f in samples:
+        if os.path.getsize(f) <= 65536:
+            write(out, "fuzz_decoder", os.path.basename(f), open(f, "rb").read())
 
     # Bitstream: a selector byte, then Annex-B parameter sets or a raw record.
     for f in samples:

@@ -33,6 +33,10 @@ assert [t[\"codec\"] for t in j[\"tracks\"]] == [\"h264\", \"aac\"], j
 assert j[\"tracks\"][0][\"samples\"] == 200 and j[\"tracks\"][0][\"syncSamples\"] == 4, j
 assert j[\"device\"][\"orientation\"] == 270, j
 '"
+for f in "$samples/clip.mp4" "$samples/voice.flac" "$samples/music.wav"; do
+  check "probe from the index is what reading $(basename "$f") gives" \
+    cmp <("$qnedit" probe --json "$f") <("$qnedit" probe --json --verify "$f")
+done
 
 # trim MP4: presentation starts at --start and lasts to --end, pre-roll hidden
 check "trim mp4" "$qnedit" --quiet trim "$samples/clip.mp4" "$work/cut.mp4" --start 2.5 --end 6

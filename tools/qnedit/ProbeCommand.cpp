@@ -26,10 +26,11 @@ const char* const kProbeHelp =
     "picture size after cropping, sample rate, channels, bits), its sample and\n"
     "sync-sample counts, and the device's items stored in the file.\n"
     "\n"
-    "Counts come from the file's index where it has one (MP4, FLAC, WAVE) without\n"
-    "reading the media; a file cut short (an MP4 whose samples lie past its end, a\n"
-    "FLAC whose last frame is missing or incomplete) fails with where it stops.\n"
-    "Damage inside the media data is found by reading it: --verify.\n"
+    "Counts come from the file's index where it has one (MP4, WAVE, FLAC of one\n"
+    "block size) without reading the media; other files are read sample by sample.\n"
+    "A file cut short (an MP4 whose samples lie past its end, a FLAC whose last\n"
+    "frame is missing or incomplete) fails with where it stops. Damage inside the\n"
+    "media data is found by reading it: --verify.\n"
     "  --json     a stable machine-readable form\n"
     "  --verify   read (and for FLAC decode) every sample, counting what was read\n";
 

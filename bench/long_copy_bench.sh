@@ -96,5 +96,6 @@ bench() {
   fi
 }
 
+echo "Every writer of ours fsyncs its output on a successful stop; ffmpeg and cp are timed with a sync of theirs."
 bench "long MP4 cut" "$mp4" 30 $((secs - 30)) mp4
 bench "long FLAC cut" "$flac" 30 $((flac_secs - 30)) flac

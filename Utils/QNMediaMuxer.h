@@ -19,7 +19,9 @@ namespace android {
 namespace qnmediaeditor {
 
 // The output formats the editor service passes; the muxer writes six of them.
-enum OutputFileFormat {
+// Fixed underlying type: a caller may hand in any int, and a value outside the
+// list must be refused, not be undefined.
+enum OutputFileFormat : int32_t {
     OUTPUT_FILE_FORMAT_MPEG_4 = 2,
     OUTPUT_FILE_FORMAT_AMR_A = 11,
     OUTPUT_FILE_FORMAT_AMR_B = 12,

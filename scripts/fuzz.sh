@@ -2,20 +2,25 @@
 # Builds the libFuzzer targets with clang (AddressSanitizer + UndefinedBehavior-
 # Sanitizer) and runs each for a bounded time, seeded from the test media and
 # the saved regression inputs. Fails on any finding; the input that caused it is
-# left in build-fuzz/findings.
+# left in findings/ of the build (build-fuzz/findings by default).
 #   FUZZ_SECONDS  time per target (default 60)
 #   FUZZ_JOBS     targets run side by side (default: the number of cores)
 #   FUZZ_TARGETS  names to run (default: every fuzz_* target)
+#   FUZZ_BUILD    an existing clang build configured with MEDIAEDITOR_BUILD_FUZZ
+#                 and address,undefined (default: build-fuzz, made here)
 set -euo pipefail
 root=$(cd "$(dirname "$0")/.." && pwd)
 seconds=${FUZZ_SECONDS:-60}
 jobs=${FUZZ_JOBS:-$(nproc)}
-build="$root/build-fuzz"
+build=${FUZZ_BUILD:-}
 
 "$root/scripts/deps.sh" --fuzz
-CC=clang CXX=clang++ cmake -S "$root" -B "$build" -DCMAKE_BUILD_TYPE=RelWithDebInfo \
-  -DMEDIAEDITOR_BUILD_FUZZ=ON -DMEDIAEDITOR_SANITIZE=address,undefined \
-  -DMEDIAEDITOR_BUILD_TESTS=OFF -DMEDIAEDITOR_BUILD_BENCH=OFF -DMEDIAEDITOR_BUILD_TOOLS=OFF >/dev/null
+if [ -z "$build" ]; then
+  build="$root/build-fuzz"
+  CC=clang CXX=clang++ cmake -S "$root" -B "$build" -DCMAKE_BUILD_TYPE=RelWithDebInfo \
+    -DMEDIAEDITOR_BUILD_FUZZ=ON -DMEDIAEDITOR_SANITIZE=address,undefined \
+    -DMEDIAEDITOR_BUILD_TESTS=OFF -DMEDIAEDITOR_BUILD_BENCH=OFF -DMEDIAEDITOR_BUILD_TOOLS=OFF >/dev/null
+fi
 cmake --build "$build" -j"$(nproc)"
 
 seeds="$build/seeds"

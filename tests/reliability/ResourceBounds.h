@@ -12,7 +12,9 @@
 #include <string>
 #include <thread>
 
-#if defined(__SANITIZE_ADDRESS__)
+#include "reliability/Sanitizers.h"
+
+#if defined(TESTS_WITH_ASAN)
 extern "C" {
 size_t __sanitizer_get_current_allocated_bytes(void);
 int __sanitizer_install_malloc_and_free_hooks(void (*malloc_hook)(const volatile void*, size_t),
@@ -81,7 +83,7 @@ private:
 class HeapGrowth {
 public:
     HeapGrowth() {
-#if defined(__SANITIZE_ADDRESS__)
+#if defined(TESTS_WITH_ASAN)
         static const int installed = __sanitizer_install_malloc_and_free_hooks(onMalloc, onFree);
         (void)installed;
         mBase = __sanitizer_get_current_allocated_bytes();
@@ -92,7 +94,7 @@ public:
 #endif
     }
     size_t peakGrowth() const {
-#if defined(__SANITIZE_ADDRESS__)
+#if defined(TESTS_WITH_ASAN)
         return peak() > mBase ? peak() - mBase : 0;
 #else
         const size_t now = residentPeak();
@@ -101,7 +103,7 @@ public:
     }
     // The largest single request seen; 0 where it cannot be observed.
     size_t largestAllocation() const {
-#if defined(__SANITIZE_ADDRESS__)
+#if defined(TESTS_WITH_ASAN)
         return largest();
 #else
         return 0;
@@ -109,7 +111,7 @@ public:
     }
 
 private:
-#if defined(__SANITIZE_ADDRESS__)
+#if defined(TESTS_WITH_ASAN)
     static std::atomic<size_t>& peak() {
         static std::atomic<size_t> value{0};
         return value;

@@ -6,6 +6,8 @@
 #include <cstdlib>
 #include <future>
 
+#include "reliability/Sanitizers.h"
+
 namespace reliability {
 
 // Runs the scenario on its own thread. One that has not finished within the
@@ -23,7 +25,7 @@ void runWithin(std::chrono::seconds limit, const char* what, Body body) {
 }
 
 // Sanitized builds run several times slower; limits scale with them.
-#if defined(__SANITIZE_THREAD__) || defined(__SANITIZE_ADDRESS__)
+#if defined(TESTS_WITH_TSAN) || defined(TESTS_WITH_ASAN)
 constexpr std::chrono::seconds kThreadTestLimit{240};
 #else
 constexpr std::chrono::seconds kThreadTestLimit{60};

@@ -12,6 +12,7 @@
 #include "../../fuzz/ExtractorTarget.h"
 #include "reliability/ReliabilitySupport.h"
 #include "reliability/ResourceBounds.h"
+#include "reliability/Sanitizers.h"
 
 using namespace android;
 using namespace reliability;
@@ -20,7 +21,7 @@ namespace {
 
 // Files up to kSmallFile bytes are cut and damaged at every offset; larger
 // ones at every header byte (where most parsing happens) and then at a stride.
-#if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
+#if defined(TESTS_WITH_ASAN) || defined(TESTS_WITH_TSAN)
 constexpr size_t kSmallFile = 2048;  // sanitized runs are several times slower
 constexpr size_t kHeaderBytes = 128;
 constexpr size_t kStridedCases = 200;

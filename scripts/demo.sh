@@ -30,6 +30,10 @@ step "Mix background music in, 6 dB down, starting after 0.5 s" \
 step "MP3 music under the clip, repeated to its end: video copied, audio re-encoded as AAC" \
   "$qnedit" mix "$samples/clip.mp4" "$samples/music.mp3" "$out/clip_with_music.mp4" --bgm-gain -9 --offset 0 --loop
 step "The clip with music" "$qnedit" probe "$out/clip_with_music.mp4"
+step "The clip's picture at 3 s, turned upright as a player shows it" \
+  "$qnedit" frame "$samples/clip.mp4" --at 3 -o "$out/clip_3s.png"
+step "Eight thumbnails along the clip, the strip under a timeline" \
+  "$qnedit" frame "$samples/clip.mp4" --count 8 -o "$out/strip/"
 step "A decoded NV12 frame as an RGB 5:6:5 picture" \
   "$qnedit" frame "$samples/frame_320x240.nv12" --size 320x240 --format nv12 -o "$out/frame.png"
 

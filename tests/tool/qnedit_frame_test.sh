@@ -7,22 +7,7 @@ set -u
 qnedit=$1
 samples=$2
 media=$3
-work=$(mktemp -d)
-trap 'rm -rf "$work"' EXIT
-pass=0
-fail=0
-check() {  # check NAME COMMAND...
-  local name=$1; shift
-  if "$@" >"$work/last.log" 2>&1; then pass=$((pass + 1)); else fail=$((fail + 1)); echo "FAIL: $name"; cat "$work/last.log"; fi
-}
-expect_status() {  # expect_status STATUS COMMAND...
-  local want=$1; shift
-  "$@" >"$work/out.txt" 2>"$work/err.txt"
-  local got=$?
-  [ "$got" -eq "$want" ] || { echo "exit $got, wanted $want"; cat "$work/err.txt"; return 1; }
-  [ "$(wc -l <"$work/err.txt")" -le 1 ] || { echo "more than one error line:"; cat "$work/err.txt"; return 1; }
-}
-have() { command -v "$1" >/dev/null; }
+source "$(dirname "$0")/checks.sh"
 # like_ffmpeg FILE SEC MATRIX: our picture and ffmpeg's agree
 like_ffmpeg() {
   local file=$1 t=$2 matrix=$3 name

@@ -7,14 +7,7 @@ set -u
 qnedit=$1
 samples=$2
 media=$(cd "$(dirname "$0")/../media" && pwd)
-work=$(mktemp -d)
-trap 'rm -rf "$work"' EXIT
-pass=0
-fail=0
-check() {  # check NAME COMMAND...
-  local name=$1; shift
-  if "$@" >"$work/last.log" 2>&1; then pass=$((pass + 1)); else fail=$((fail + 1)); echo "FAIL: $name"; cat "$work/last.log"; fi
-}
+source "$(dirname "$0")/checks.sh"
 q() { "$qnedit" --quiet "$@"; }
 ff() { ffmpeg -nostdin -v error -y "$@"; }
 # Video packets as (size, hash) and their times in ms: the bytes and times,
@@ -24,7 +17,6 @@ packet_times() { ffprobe -v error -select_streams v -show_entries packet=pts_tim
 decoded_seconds() {  # the audio ffmpeg decodes, in seconds
   ffmpeg -nostdin -v error -i "$1" -map 0:a -f s16le -ac 1 -ar 44100 - | wc -c | awk '{print $1 / 88200}'
 }
-near() { awk -v a="$1" -v b="$2" -v e="$3" 'BEGIN { d = a - b; if (d < 0) d = -d; exit !(d <= e) }'; }
 clean_decode() { [ -z "$(ffmpeg -nostdin -v error -i "$1" -f null - 2>&1)" ]; }
 
 if ! command -v ffmpeg >/dev/null || ! command -v ffprobe >/dev/null; then

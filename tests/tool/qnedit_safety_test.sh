@@ -7,19 +7,13 @@
 set -u
 qnedit=$1
 samples=$2
-work=$(mktemp -d)
+source "$(dirname "$0")/checks.sh"
 mounted=""
 cleanup() {
   [ -n "$mounted" ] && umount "$mounted" 2>/dev/null
   rm -rf "$work"
 }
 trap cleanup EXIT
-pass=0
-fail=0
-check() {  # check NAME COMMAND...
-  local name=$1; shift
-  if "$@" >"$work/last.log" 2>&1; then pass=$((pass + 1)); else fail=$((fail + 1)); echo "FAIL: $name"; cat "$work/last.log"; fi
-}
 # status WANT COMMAND...: the exit status, and at most one line on stderr
 status() {
   local want=$1; shift

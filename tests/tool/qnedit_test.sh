@@ -5,24 +5,8 @@
 set -u
 qnedit=$1
 samples=$2
-work=$(mktemp -d)
-trap 'rm -rf "$work"' EXIT
-pass=0
-fail=0
-check() {  # check NAME COMMAND...
-  local name=$1; shift
-  if "$@" >"$work/last.log" 2>&1; then pass=$((pass + 1)); else fail=$((fail + 1)); echo "FAIL: $name"; cat "$work/last.log"; fi
-}
-expect_status() {  # expect_status STATUS COMMAND...
-  local want=$1; shift
-  "$@" >"$work/out.txt" 2>"$work/err.txt"
-  local got=$?
-  [ "$got" -eq "$want" ] || { echo "exit $got, wanted $want"; cat "$work/err.txt"; return 1; }
-  [ "$(wc -l <"$work/err.txt")" -le 1 ] || { echo "more than one error line:"; cat "$work/err.txt"; return 1; }
-}
-have() { command -v "$1" >/dev/null; }
+source "$(dirname "$0")/checks.sh"
 duration() { ffprobe -v error -show_entries format=duration -of csv=p=0 "$1"; }
-near() { awk -v a="$1" -v b="$2" -v e="$3" 'BEGIN { d = a - b; if (d < 0) d = -d; exit !(d <= e) }'; }
 
 # probe
 check "probe text" "$qnedit" --quiet probe "$samples/clip.mp4"

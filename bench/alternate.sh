@@ -8,7 +8,7 @@
 measure_once() {
   /usr/bin/time -o "$out/time.txt" -f "%e %U %S %M" bash -c "$1" >/dev/null 2>"$out/err.txt" ||
     { echo "failed: $1" >&2; cat "$out/err.txt" >&2; }
-  awk '{ printf "%s %.2f %s\n", $1, $2 + $3, $4 }' "$out/time.txt"
+  awk '{ printf "%s %.3f %s\n", $1, $2 + $3, $4 }' "$out/time.txt"
 }
 median() { sort -n | awk '{ v[NR] = $1 } END { print (NR % 2) ? v[(NR + 1) / 2] : (v[NR / 2] + v[NR / 2 + 1]) / 2 }'; }
 column_of() { printf '%s\n' "${@:2}" | awk -v c="$1" '{ print $c }'; }
@@ -28,7 +28,7 @@ alternate() {
   read -r ow oc om <<<"$(stats_of "${ours[@]}")"
   read -r pw pc pm <<<"$(stats_of "${peer[@]}")"
   echo "== $name, median of $runs alternated runs"
-  printf '  %-40s wall %7.2f s  cpu %7.2f s  peak RSS %4d MB\n' "$ours_label" "$ow" "$oc" $((om / 1024))
-  printf '  %-40s wall %7.2f s  cpu %7.2f s  peak RSS %4d MB\n' "$peer_label" "$pw" "$pc" $((pm / 1024))
+  printf '  %-40s wall %7.3f s  cpu %7.3f s  peak RSS %4d MB\n' "$ours_label" "$ow" "$oc" $((om / 1024))
+  printf '  %-40s wall %7.3f s  cpu %7.3f s  peak RSS %4d MB\n' "$peer_label" "$pw" "$pc" $((pm / 1024))
   echo "  ours/peer: wall $(ratio "$ow" "$pw"), cpu $(ratio "$oc" "$pc")"
 }

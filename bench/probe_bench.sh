@@ -48,29 +48,13 @@ if [[ ! -s $flac ]]; then
 fi
 [[ -s $wav ]] || ffmpeg -hide_banner -loglevel error -y -i "$flac" -c:a pcm_s16le "$wav"
 
-# "wall cpu peak_kb" of one run.
-measure() {
-  /usr/bin/time -o "$out/time.txt" -f "%e %U %S %M" "$@" >/dev/null 2>&1 || echo "failed: $*" >&2
-  awk '{ printf "%s %.3f %s\n", $1, $2 + $3, $4 }' "$out/time.txt"
-}
-median() { sort -n | awk '{ v[NR] = $1 } END { print (NR % 2) ? v[(NR + 1) / 2] : (v[NR / 2] + v[NR / 2 + 1]) / 2 }'; }
-col() { printf '%s\n' "${@:2}" | awk -v c="$1" '{ print $c }'; }
-stats() { echo "$(col 1 "$@" | median) $(col 2 "$@" | median) $(col 3 "$@" | sort -n | tail -1)"; }
-ratio() { awk -v a="$1" -v b="$2" 'BEGIN { if (b > 0) printf "%.2f", a / b; else print "n/a" }'; }
-row() { printf '  %-34s wall %6.3f s  cpu %6.3f s  peak RSS %4d MB\n' "$1" "$2" "$3" $(($4 / 1024)); }
+source "$(dirname "$0")/alternate.sh"
+ours_cmd=$(printf '%q ' "${qnedit[@]}")
+row() { printf '  %-40s wall %7.3f s  cpu %7.3f s  peak RSS %4d MB\n' "$1" "$2" "$3" $(($4 / 1024)); }
 
 probe() {
-  local file=$1 ours=() ff=()
-  for _ in $(seq "$runs"); do
-    ours+=("$(measure "${qnedit[@]}" --quiet probe "$file")")
-    ff+=("$(measure ffprobe -v error -show_format -show_streams "$file")")
-  done
-  read -r ow oc om <<<"$(stats "${ours[@]}")"
-  read -r fw fc fm <<<"$(stats "${ff[@]}")"
-  echo "== probe $(basename "$file") ($(stat -L -c %s "$file") bytes), median of $runs alternated runs"
-  row "qnedit probe" "$ow" "$oc" "$om"
-  row "ffprobe -show_format -show_streams" "$fw" "$fc" "$fm"
-  echo "  ours/ffprobe: wall $(ratio "$ow" "$fw"), cpu $(ratio "$oc" "$fc")"
+  alternate "probe $(basename "$1") ($(stat -L -c %s "$1") bytes)" "$ours_cmd --quiet probe '$1'" \
+    "ffprobe -v error -show_format -show_streams '$1'" "qnedit probe" "ffprobe -show_format -show_streams"
 }
 
 probe "$mp4"
@@ -83,9 +67,9 @@ for file in "$mp4_short" "$mp4"; do
   mid=$(awk -v d="$secs" 'BEGIN { printf "%d", d / 2 }')
   r=()
   for _ in $(seq "$runs"); do
-    r+=("$(measure "${qnedit[@]}" --quiet trim "$file" "$out/cut.mp4" --start "$mid" --end $((mid + 10)))")
+    r+=("$(measure_once "$ours_cmd --quiet trim '$file' '$out/cut.mp4' --start $mid --end $((mid + 10))")")
     rm -f "$out/cut.mp4"
   done
-  read -r w c m <<<"$(stats "${r[@]}")"
+  read -r w c m <<<"$(stats_of "${r[@]}")"
   row "trim $(basename "$file")" "$w" "$c" "$m"
 done

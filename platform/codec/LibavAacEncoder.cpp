@@ -5,6 +5,7 @@
 #include <media/stagefright/MediaErrors.h>
 
 #include "codec/AacEncoder.h"
+#include "codec/LibavCodecState.h"
 #include "codec/LibavLog.h"
 
 extern "C" {
@@ -28,80 +29,68 @@ bool AacRate(int32_t rate) {
 
 class LibavAacEncoder : public AacEncoder {
 public:
-    ~LibavAacEncoder() override {
-        av_frame_free(&mFrame);
-        av_packet_free(&mPacket);
-        avcodec_free_context(&mContext);
-    }
-
     bool open(int32_t rate, int32_t channels, int32_t bitRate) {
         const AVCodec* codec = avcodec_find_encoder(AV_CODEC_ID_AAC);
-        if (codec == nullptr || (mContext = avcodec_alloc_context3(codec)) == nullptr ||
-            (mPacket = av_packet_alloc()) == nullptr || (mFrame = av_frame_alloc()) == nullptr) {
-            ALOGE("cannot set up an AAC encoder");
-            return false;
-        }
+        if (!mCodec.allocate(codec)) return false;
         mChannels = channels;
-        mContext->sample_rate = rate;
-        av_channel_layout_default(&mContext->ch_layout, channels);
-        mContext->sample_fmt = AV_SAMPLE_FMT_FLTP;
-        mContext->bit_rate = bitRate;
-        mContext->profile = FF_PROFILE_AAC_LOW;
+        mCodec.context->sample_rate = rate;
+        av_channel_layout_default(&mCodec.context->ch_layout, channels);
+        mCodec.context->sample_fmt = AV_SAMPLE_FMT_FLTP;
+        mCodec.context->bit_rate = bitRate;
+        mCodec.context->profile = FF_PROFILE_AAC_LOW;
         // The configuration goes into the track's esds, not in-band.
-        mContext->flags |= AV_CODEC_FLAG_GLOBAL_HEADER;
-        const int err = avcodec_open2(mContext, codec, nullptr);
-        if (err < 0 || mContext->extradata_size < 2 || mContext->frame_size <= 0) {
+        mCodec.context->flags |= AV_CODEC_FLAG_GLOBAL_HEADER;
+        const int err = avcodec_open2(mCodec.context, codec, nullptr);
+        if (err < 0 || mCodec.context->extradata_size < 2 || mCodec.context->frame_size <= 0) {
             ALOGE("the AAC encoder refuses %d Hz, %d channels (%d)", rate, channels, err);
             return false;
         }
-        mConfig.assign(mContext->extradata, mContext->extradata + mContext->extradata_size);
-        mFrame->format = AV_SAMPLE_FMT_FLTP;
-        mFrame->sample_rate = rate;
-        mFrame->nb_samples = mContext->frame_size;
-        if (av_channel_layout_copy(&mFrame->ch_layout, &mContext->ch_layout) < 0 || av_frame_get_buffer(mFrame, 0) < 0) {
+        mConfig.assign(mCodec.context->extradata, mCodec.context->extradata + mCodec.context->extradata_size);
+        mCodec.frame->format = AV_SAMPLE_FMT_FLTP;
+        mCodec.frame->sample_rate = rate;
+        mCodec.frame->nb_samples = mCodec.context->frame_size;
+        if (av_channel_layout_copy(&mCodec.frame->ch_layout, &mCodec.context->ch_layout) < 0 || av_frame_get_buffer(mCodec.frame, 0) < 0) {
             return false;
         }
         return true;
     }
 
-    size_t frameSize() const override { return static_cast<size_t>(mContext->frame_size); }
-    int32_t delay() const override { return mContext->initial_padding; }
+    size_t frameSize() const override { return static_cast<size_t>(mCodec.context->frame_size); }
+    int32_t delay() const override { return mCodec.context->initial_padding; }
     const std::vector<uint8_t>& config() const override { return mConfig; }
 
     status_t encode(const int16_t* pcm, size_t frames, std::vector<std::vector<uint8_t>>* units) override {
         if (frames == 0 || frames > frameSize()) return BAD_VALUE;
-        if (av_frame_make_writable(mFrame) < 0) return NO_MEMORY;
+        if (av_frame_make_writable(mCodec.frame) < 0) return NO_MEMORY;
         // The encoder takes a short last frame; it is padded so that every
         // frame sent has the size it was opened with.
         for (int c = 0; c < mChannels; ++c) {
-            float* plane = reinterpret_cast<float*>(mFrame->extended_data[c]);
+            float* plane = reinterpret_cast<float*>(mCodec.frame->extended_data[c]);
             for (size_t i = 0; i < frames; ++i) plane[i] = pcm[i * mChannels + c] * (1.0f / 32768.0f);
             for (size_t i = frames; i < frameSize(); ++i) plane[i] = 0.0f;
         }
-        mFrame->pts = mNextPts;
-        mNextPts += mContext->frame_size;
-        if (avcodec_send_frame(mContext, mFrame) < 0) return UNKNOWN_ERROR;
+        mCodec.frame->pts = mNextPts;
+        mNextPts += mCodec.context->frame_size;
+        if (avcodec_send_frame(mCodec.context, mCodec.frame) < 0) return UNKNOWN_ERROR;
         return receive(units);
     }
 
     status_t finish(std::vector<std::vector<uint8_t>>* units) override {
-        if (avcodec_send_frame(mContext, nullptr) < 0) return UNKNOWN_ERROR;
+        if (avcodec_send_frame(mCodec.context, nullptr) < 0) return UNKNOWN_ERROR;
         return receive(units);
     }
 
 private:
     status_t receive(std::vector<std::vector<uint8_t>>* units) {
         int err;
-        while ((err = avcodec_receive_packet(mContext, mPacket)) >= 0) {
-            units->emplace_back(mPacket->data, mPacket->data + mPacket->size);
-            av_packet_unref(mPacket);
+        while ((err = avcodec_receive_packet(mCodec.context, mCodec.packet)) >= 0) {
+            units->emplace_back(mCodec.packet->data, mCodec.packet->data + mCodec.packet->size);
+            av_packet_unref(mCodec.packet);
         }
         return err == AVERROR(EAGAIN) || err == AVERROR_EOF ? OK : UNKNOWN_ERROR;
     }
 
-    AVCodecContext* mContext = nullptr;
-    AVPacket* mPacket = nullptr;
-    AVFrame* mFrame = nullptr;
+    LibavCodecState mCodec;
     int mChannels = 0;
     int64_t mNextPts = 0;
     std::vector<uint8_t> mConfig;

@@ -7,6 +7,7 @@
 #include <media/stagefright/MediaErrors.h>
 
 #include "codec/CodecConfig.h"
+#include "codec/LibavCodecState.h"
 #include "codec/LibavLog.h"
 #include "codec/PictureConvert.h"
 #include "codec/VideoDecoder.h"
@@ -66,33 +67,17 @@ int32_t Range(const AVFrame& frame) {
 
 class LibavVideoDecoder : public VideoDecoder {
 public:
-    ~LibavVideoDecoder() override {
-        av_frame_free(&mFrame);
-        av_packet_free(&mPacket);
-        avcodec_free_context(&mContext);
-    }
-
     bool open(const VideoCodecConfig& config, int64_t maxPixels, int threads) {
         const AVCodec* codec =
             avcodec_find_decoder(config.codec == VideoCodec::kAvc ? AV_CODEC_ID_H264 : AV_CODEC_ID_HEVC);
-        if (codec == nullptr || (mContext = avcodec_alloc_context3(codec)) == nullptr ||
-            (mPacket = av_packet_alloc()) == nullptr || (mFrame = av_frame_alloc()) == nullptr) {
-            ALOGE("cannot set up a decoder");
-            return false;
-        }
-        const size_t size = config.extradata.size();
-        if (size > INT32_MAX - AV_INPUT_BUFFER_PADDING_SIZE) return false;
-        mContext->extradata = static_cast<uint8_t*>(av_mallocz(size + AV_INPUT_BUFFER_PADDING_SIZE));
-        if (mContext->extradata == nullptr) return false;
-        memcpy(mContext->extradata, config.extradata.data(), size);
-        mContext->extradata_size = static_cast<int>(size);
+        if (!mCodec.allocate(codec) || !mCodec.setExtradata(config.extradata)) return false;
         // The crop is reported, not applied: callers get the coded picture and
         // its visible rectangle, as a hardware decoder would give them.
-        mContext->apply_cropping = 0;
-        mContext->max_pixels = maxPixels;
-        mContext->thread_count = threads;
-        mContext->pkt_timebase = AVRational{1, 1000000};
-        const int err = avcodec_open2(mContext, codec, nullptr);
+        mCodec.context->apply_cropping = 0;
+        mCodec.context->max_pixels = maxPixels;
+        mCodec.context->thread_count = threads;
+        mCodec.context->pkt_timebase = AVRational{1, 1000000};
+        const int err = avcodec_open2(mCodec.context, codec, nullptr);
         if (err < 0) {
             ALOGW("the %s decoder refuses the track's configuration (%d)", codec->name, err);
             return false;
@@ -104,41 +89,41 @@ public:
     status_t decode(const uint8_t* data, size_t size, int64_t timeUs, std::vector<VideoPicture>* out) override {
         // An empty packet would tell the codec the stream has ended.
         if (size == 0 || size > INT32_MAX - AV_INPUT_BUFFER_PADDING_SIZE) return ERROR_MALFORMED;
-        av_packet_unref(mPacket);
-        if (av_new_packet(mPacket, static_cast<int>(size)) < 0) return NO_MEMORY;
-        memcpy(mPacket->data, data, size);
-        mPacket->pts = timeUs;
-        int err = avcodec_send_packet(mContext, mPacket);
+        av_packet_unref(mCodec.packet);
+        if (av_new_packet(mCodec.packet, static_cast<int>(size)) < 0) return NO_MEMORY;
+        memcpy(mCodec.packet->data, data, size);
+        mCodec.packet->pts = timeUs;
+        int err = avcodec_send_packet(mCodec.context, mCodec.packet);
         if (err == AVERROR(EAGAIN)) {
             // Output must be taken before more input goes in.
             status_t result = receiveAll(out);
             if (result != OK && result != ERROR_UNSUPPORTED) return result;
-            err = avcodec_send_packet(mContext, mPacket);
+            err = avcodec_send_packet(mCodec.context, mCodec.packet);
         }
-        av_packet_unref(mPacket);
+        av_packet_unref(mCodec.packet);
         const status_t received = receiveAll(out);
         if (err < 0 && err != AVERROR(EAGAIN)) return err == AVERROR(ENOMEM) ? status_t(NO_MEMORY) : status_t(ERROR_MALFORMED);
         return received;
     }
 
     status_t drain(std::vector<VideoPicture>* out) override {
-        avcodec_send_packet(mContext, nullptr);
+        avcodec_send_packet(mCodec.context, nullptr);
         const status_t err = receiveAll(out);
         // Ready for more input afterwards.
-        avcodec_flush_buffers(mContext);
+        avcodec_flush_buffers(mCodec.context);
         return err;
     }
 
     void setSkipBefore(int64_t timeUs) override { mSkipBeforeUs = timeUs; }
-    void flush() override { avcodec_flush_buffers(mContext); }
+    void flush() override { avcodec_flush_buffers(mCodec.context); }
 
 private:
     status_t receiveAll(std::vector<VideoPicture>* out) {
         status_t result = OK;
         int err;
-        while ((err = avcodec_receive_frame(mContext, mFrame)) >= 0) {
-            const int64_t timeUs = mFrame->best_effort_timestamp != AV_NOPTS_VALUE ? mFrame->best_effort_timestamp
-                                                                                   : mFrame->pts;
+        while ((err = avcodec_receive_frame(mCodec.context, mCodec.frame)) >= 0) {
+            const AVFrame& f = *mCodec.frame;
+            const int64_t timeUs = f.best_effort_timestamp != AV_NOPTS_VALUE ? f.best_effort_timestamp : f.pts;
             if (timeUs == AV_NOPTS_VALUE || timeUs >= mSkipBeforeUs) {
                 VideoPicture picture;
                 const status_t converted = convert(timeUs == AV_NOPTS_VALUE ? 0 : timeUs, &picture);
@@ -148,7 +133,7 @@ private:
                     result = converted;
                 }
             }
-            av_frame_unref(mFrame);
+            av_frame_unref(mCodec.frame);
         }
         if (err != AVERROR(EAGAIN) && err != AVERROR_EOF) result = ERROR_MALFORMED;
         return result;
@@ -156,14 +141,14 @@ private:
 
     status_t convert(int64_t timeUs, VideoPicture* picture) {
         PlanarPicture planes;
-        if (!DescribePlanes(*mFrame, &planes)) {
+        if (!DescribePlanes(*mCodec.frame, &planes)) {
             ALOGW("pictures in %s have no 4:2:0 form here",
-                  av_get_pix_fmt_name(static_cast<AVPixelFormat>(mFrame->format)));
+                  av_get_pix_fmt_name(static_cast<AVPixelFormat>(mCodec.frame->format)));
             return ERROR_UNSUPPORTED;
         }
         const int64_t w = EvenSize(planes.width), h = EvenSize(planes.height);
-        const uint64_t left = mFrame->crop_left, right = mFrame->crop_right;
-        const uint64_t top = mFrame->crop_top, bottom = mFrame->crop_bottom;
+        const uint64_t left = mCodec.frame->crop_left, right = mCodec.frame->crop_right;
+        const uint64_t top = mCodec.frame->crop_top, bottom = mCodec.frame->crop_bottom;
         if (w <= 0 || h <= 0 || w * h > mMaxPixels || left + right >= uint64_t(planes.width) ||
             top + bottom >= uint64_t(planes.height)) {
             ALOGW("a picture of %dx%d (crop %llu,%llu,%llu,%llu) is refused", planes.width, planes.height,
@@ -181,17 +166,15 @@ private:
         picture->cropTop = static_cast<int32_t>(top);
         picture->cropRight = static_cast<int32_t>(planes.width - 1 - right);
         picture->cropBottom = static_cast<int32_t>(planes.height - 1 - bottom);
-        picture->range = Range(*mFrame);
+        picture->range = Range(*mCodec.frame);
         // libavutil numbers these as ISO/IEC 23001-8 does.
-        picture->primaries = mFrame->color_primaries;
-        picture->transfer = mFrame->color_trc;
-        picture->matrix = mFrame->colorspace;
+        picture->primaries = mCodec.frame->color_primaries;
+        picture->transfer = mCodec.frame->color_trc;
+        picture->matrix = mCodec.frame->colorspace;
         return OK;
     }
 
-    AVCodecContext* mContext = nullptr;
-    AVPacket* mPacket = nullptr;
-    AVFrame* mFrame = nullptr;
+    LibavCodecState mCodec;
     int64_t mMaxPixels = 0;
     int64_t mSkipBeforeUs = std::numeric_limits<int64_t>::min();
 };
